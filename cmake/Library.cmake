@@ -1,0 +1,67 @@
+set(GRIDMILL_SOURCES
+    basic/exceptions/exceptions.cpp
+    basic/tessel/complexinterpretation.cpp
+    basic/tessel/datatype.cpp
+    basic/tessel/mask/mask.cpp
+    basic/tessel/raster.cpp
+    processes/gridmill/averagechannels.cpp
+    processes/gridmill/filterasp.cpp
+    processes/gridmill/filterslp.cpp
+    processes/gridmill/kernels/integermean.cpp
+    processes/gridmill/kernels/maskedcells.cpp
+    processes/gridmill/kernels/rowconversions.cpp
+    processes/gridmill/kernels/wholedegrees.cpp)
+list(TRANSFORM GRIDMILL_SOURCES PREPEND ${PROJECT_SOURCE_DIR}/)
+
+# Installed headers: the public ones of the house and those that they include.
+set(GRIDMILL_HEADERS
+    basic/core/export.h
+    basic/core/interpretationtypes.h
+    basic/core/typedispatch/extendtypedispatch.h
+    basic/core/typedispatch/typedispatch.h
+    basic/core/typedispatch/typelist.h
+    basic/exceptions/exceptions.h
+    basic/exceptions/throw.h
+    basic/tessel/complexinterpretation.h
+    basic/tessel/datatype.h
+    basic/tessel/mask/mask.h
+    basic/tessel/mask/maskdecision.h
+    basic/tessel/raster.h
+    processes/gridmill/averagechannels.h
+    processes/gridmill/filterasp.h
+    processes/gridmill/filterslp.h
+    processes/gridmill/frame/processorcache.h
+    processes/gridmill/gridmill.h
+    processes/gridmill/iprocessor.h)
+
+# gridmill_objects(<name> <isa>): the compiled sources for one setting of GRIDMILL_ISA.
+function(gridmill_objects name isa)
+  add_library(${name} OBJECT ${GRIDMILL_SOURCES})
+  set_target_properties(${name} PROPERTIES POSITION_INDEPENDENT_CODE ON CXX_VISIBILITY_PRESET hidden
+                                           VISIBILITY_INLINES_HIDDEN ON)
+  target_include_directories(${name} PUBLIC ${PROJECT_SOURCE_DIR})
+  target_link_libraries(${name} PRIVATE gridmill_numerics gridmill_warnings OpenMP::OpenMP_CXX)
+  if(isa STREQUAL "x86-64")
+    target_compile_definitions(${name} PRIVATE GRIDMILL_ISA_LEVEL=1)
+  elseif(isa STREQUAL "x86-64-v3")
+    target_compile_definitions(${name} PRIVATE GRIDMILL_ISA_LEVEL=3)
+  elseif(isa STREQUAL "x86-64-v4")
+    target_compile_definitions(${name} PRIVATE GRIDMILL_ISA_LEVEL=4)
+  elseif(NOT isa STREQUAL "auto")
+    message(FATAL_ERROR "GRIDMILL_ISA is '${isa}'; expected auto, x86-64, x86-64-v3 or x86-64-v4")
+  endif()
+endfunction()
+
+gridmill_objects(gridmill_objects ${GRIDMILL_ISA})
+
+add_library(gridmill SHARED $<TARGET_OBJECTS:gridmill_objects>)
+add_library(gridmill::gridmill ALIAS gridmill)
+set_target_properties(gridmill PROPERTIES VERSION ${PROJECT_VERSION} SOVERSION ${GRIDMILL_ABI})
+target_include_directories(
+  gridmill INTERFACE $<BUILD_INTERFACE:${PROJECT_SOURCE_DIR}>
+                     $<INSTALL_INTERFACE:${CMAKE_INSTALL_INCLUDEDIR}/gridmill>)
+target_compile_features(gridmill INTERFACE cxx_std_17)
+target_link_libraries(gridmill PRIVATE OpenMP::OpenMP_CXX)
+# Multiversioned functions and inner processors leave the compiler visible; the linker hides them.
+target_link_options(gridmill PRIVATE LINKER:--version-script=${PROJECT_SOURCE_DIR}/cmake/gridmill.map)
+set_property(TARGET gridmill APPEND PROPERTY LINK_DEPENDS ${PROJECT_SOURCE_DIR}/cmake/gridmill.map)

@@ -1,0 +1,5 @@
+add_library(gridmill_warnings INTERFACE)
+target_compile_options(gridmill_warnings INTERFACE -Wall -Wextra -Wconversion)
+if(GRIDMILL_WARNINGS_AS_ERRORS)
+  target_compile_options(gridmill_warnings INTERFACE -Werror)
+endif()
