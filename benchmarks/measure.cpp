@@ -1,0 +1,152 @@
+#include "benchmarks/measure.h"
+
+#include <algorithm>
+#include <cmath>
+#include <cstring>
+#include <functional>
+#include <string>
+#include <utility>
+#include <vector>
+
+#include <omp.h>
+#include <time.h>
+
+namespace orvik::bench {
+
+namespace {
+
+double slice = 0.02;
+
+double Seconds(clockid_t clock) {
+  timespec now{};
+  clock_gettime(clock, &now);
+  return static_cast<double>(now.tv_sec) + 1e-9 * static_cast<double>(now.tv_nsec);
+}
+
+double Median(std::vector<double> values) {
+  const auto middle = values.begin() + static_cast<std::ptrdiff_t>(values.size() / 2);
+  std::nth_element(values.begin(), middle, values.end());
+  return *middle;
+}
+
+/// One that takes its turn in each round: what it does, and the seconds of a call in each round.
+class Turn {
+ public:
+  /// @param seconds  how long a turn takes at least; one call takes what it takes
+  Turn(std::string name, clockid_t clock, double seconds, std::function<void()> run)
+      : name_(std::move(name)), clock_(clock), run_(std::move(run)) {
+    run_();
+    const double once = Time(1);
+    calls_ = static_cast<std::size_t>(std::max(1.0, std::ceil(seconds / once)));
+  }
+
+  void Take() { seconds_.push_back(Time(calls_)); }
+
+  const std::string& Name() const { return name_; }
+  const std::vector<double>& Rounds() const { return seconds_; }
+  double Best() const { return *std::min_element(seconds_.begin(), seconds_.end()); }
+
+ private:
+  double Time(std::size_t calls) const {
+    const double start = Seconds(clock_);
+    for (std::size_t i = 0; i < calls; ++i) run_();
+    return (Seconds(clock_) - start) / static_cast<double>(calls);
+  }
+
+  std::string name_;
+  clockid_t clock_;
+  std::function<void()> run_;
+  std::size_t calls_ = 1;
+  std::vector<double> seconds_;
+};
+
+void TakeTurns(benchmark::State& state, std::vector<Turn>& turns) {
+  for ([[maybe_unused]] auto round : state) {
+    for (Turn& turn : turns) turn.Take();
+    state.SetIterationTime(turns.front().Rounds().back());
+  }
+}
+
+double MedianRatio(const Turn& first, const Turn& other) {
+  std::vector<double> ratios;
+  for (std::size_t i = 0; i < first.Rounds().size(); ++i)
+    ratios.push_back(other.Rounds()[i] / first.Rounds()[i]);
+  return Median(ratios);
+}
+
+/// Runs both once, over outputs that differ in every byte.
+bool TwinsAgree(const Row& row, const Workload& work) {
+  std::memset(work.out->data, 0xaa, work.out->dataSize);
+  std::memset(work.twin->data, 0x55, work.twin->dataSize);
+  row.gridmill(work);
+  row.naive(work);
+  return std::memcmp(work.out->data, work.twin->data, work.out->dataSize) == 0;
+}
+
+/// A plain copy that reads and writes as many bytes as a pass over the workload does.
+class Copy {
+ public:
+  explicit Copy(std::size_t bytesMoved) : source_(bytesMoved / 2, 1), target_(bytesMoved / 2) {}
+
+  void operator()() {
+    std::memcpy(target_.data(), source_.data(), source_.size());
+    benchmark::DoNotOptimize(target_.data());
+    benchmark::ClobberMemory();
+  }
+
+ private:
+  std::vector<unsigned char> source_;
+  std::vector<unsigned char> target_;
+};
+
+}  // namespace
+
+void SetSlice(double seconds) { slice = seconds; }
+
+void MeasureRow(benchmark::State& state, const Row& row, std::uint32_t size) {
+  omp_set_num_threads(1);
+  const Workload work = row.workload(size);
+  if (!TwinsAgree(row, work)) {
+    state.SkipWithError("gridmill and its naive twin differ");
+    return;
+  }
+
+  std::vector<Turn> turns;
+  const auto enter = [&](const char* name, Contestant run) {
+    if (run != nullptr) turns.emplace_back(name, CLOCK_THREAD_CPUTIME_ID, slice, [&work, run] { run(work); });
+  };
+  enter("gridmill", row.gridmill);
+  enter("naive", row.naive);
+  enter("opencv", row.opencv);
+  enter("gdal", row.gdal);
+  turns.emplace_back("roof", CLOCK_THREAD_CPUTIME_ID, slice, Copy(work.BytesMoved()));
+
+  TakeTurns(state, turns);
+  const double megapixels = 1e-6 * static_cast<double>(work.Pixels());
+  for (const Turn& turn : turns) {
+    state.counters[turn.Name()] = megapixels / Median(turn.Rounds());
+    state.counters["vs " + turn.Name()] = MedianRatio(turns.front(), turn);
+  }
+}
+
+void MeasureTwoThreads(benchmark::State& state, const Row& row, std::uint32_t size) {
+  const Workload work = row.workload(size);
+  std::vector<Turn> turns;
+  const auto enter = [&](const char* name, int threads) {
+    turns.emplace_back(name, CLOCK_MONOTONIC, 0.0, [&work, &row, threads] {
+      omp_set_num_threads(threads);
+      row.gridmill(work);
+    });
+  };
+  enter("gridmill", 2);
+  enter("one_core", 1);
+
+  TakeTurns(state, turns);
+  const double megapixels = 1e-6 * static_cast<double>(work.Pixels());
+  for (const Turn& turn : turns) {
+    state.counters[turn.Name()] = megapixels / turn.Best();
+    state.counters["vs " + turn.Name()] = turn.Best() / turns.front().Best();
+  }
+}
+
+}  // namespace orvik::bench

@@ -1,0 +1,19 @@
+#pragma once
+
+#include "benchmarks/workloads.h"
+
+/// In front of a peer's function: its address is null where the peer's library is not installed.
+#define GRIDMILL_PEER __attribute__((weak))
+
+namespace orvik::bench {
+
+// Each computes its library's own comparable quantity into `twin`, on the caller's thread alone.
+
+GRIDMILL_PEER void OpenCvSlope(const Workload& work);
+GRIDMILL_PEER void OpenCvAspect(const Workload& work);
+GRIDMILL_PEER void OpenCvMean(const Workload& work);
+
+GRIDMILL_PEER void GdalSlope(const Workload& work);
+GRIDMILL_PEER void GdalAspect(const Workload& work);
+
+}  // namespace orvik::bench

@@ -1,0 +1,141 @@
+#include "benchmarks/workloads.h"
+
+#include <array>
+#include <cmath>
+#include <random>
+#include <vector>
+
+namespace orvik::bench {
+
+namespace {
+
+using Random = std::mt19937;
+
+/// A number from -1 to 1.
+float Noise(Random& random) { return static_cast<float>(random()) * 0x1p-31f - 1.0f; }
+
+struct Wave {
+  float pixels;  // the wavelength
+  float height;
+};
+
+/// Waves along both axes, each the product of a sine of x and one of y.
+class Surface {
+ public:
+  Surface(std::uint32_t size, float phase) : size_(size) {
+    for (const Wave& wave : kWaves) {
+      const float frequency = 6.2831853f / wave.pixels;
+      for (std::uint32_t i = 0; i < size; ++i)
+        alongX_.push_back(wave.height * std::sin(frequency * static_cast<float>(i) + phase));
+      for (std::uint32_t i = 0; i < size; ++i)
+        alongY_.push_back(std::sin(frequency * static_cast<float>(i) + 2.0f * phase));
+    }
+  }
+
+  float At(std::size_t x, std::size_t y) const {
+    float sum = 0.0f;
+    for (std::size_t k = 0; k < kWaves.size(); ++k) sum += alongX_[k * size_ + x] * alongY_[k * size_ + y];
+    return sum;
+  }
+
+ private:
+  static constexpr std::array<Wave, 3> kWaves{{{401.0f, 300.0f}, {61.0f, 50.0f}, {17.0f, 8.0f}}};
+
+  std::size_t size_;
+  std::vector<float> alongX_;
+  std::vector<float> alongY_;
+};
+
+std::vector<Surface> SurfacesFor(const tessel::Raster& raster) {
+  std::vector<Surface> surfaces;
+  for (std::uint32_t c = 0; c < raster.channels; ++c)
+    surfaces.emplace_back(raster.bufferWidth, 0.7f + static_cast<float>(c));
+  return surfaces;
+}
+
+/// `sample(x, y, c)` of the whole buffer, margins included.
+template <class Pixel, class Sample>
+void Fill(tessel::Raster& raster, const Sample& sample) {
+  Pixel* element = reinterpret_cast<Pixel*>(raster.data);
+  for (std::size_t y = 0; y < raster.bufferHeight; ++y)
+    for (std::size_t x = 0; x < raster.bufferWidth; ++x)
+      for (std::size_t c = 0; c < raster.channels; ++c) *element++ = static_cast<Pixel>(sample(x, y, c));
+}
+
+std::unique_ptr<tessel::Mask> MakeMask(const tessel::Raster& raster, MaskPattern pattern) {
+  if (pattern == MaskPattern::kNone) return nullptr;
+  auto mask = std::make_unique<tessel::Mask>(raster.width, raster.height, raster, false);
+  const std::size_t pixels = std::size_t{mask->bufferWidth} * mask->bufferHeight;
+  Random random(2);
+  bool valid = false;
+  std::size_t runEnd = 0;
+  for (std::size_t bit = 0; bit < pixels; ++bit) {
+    if (pattern == MaskPattern::kRandom) {
+      valid = (random() >> 31) != 0;
+    } else if (bit == runEnd) {
+      valid = !valid;
+      runEnd += 64 + random() % 512;
+    }
+    if (valid) mask->bits[bit >> 3] |= static_cast<unsigned char>(0x80 >> (bit & 7));
+  }
+  return mask;
+}
+
+std::size_t ImageBytes(const tessel::Raster& raster) {
+  return std::size_t{raster.width} * raster.height * raster.channels * (raster.dataType.sizeBits / 8);
+}
+
+template <class In, class Out>
+Workload MakeWorkload(std::uint32_t size, std::uint32_t inChannels, std::uint32_t outChannels,
+                      std::uint32_t margin, MaskPattern pattern) {
+  const tessel::RasterInfo inInfo(size, size, inChannels, tessel::DataType::Of<In>());
+  const tessel::RasterInfo outInfo(size, size, outChannels, tessel::DataType::Of<Out>());
+  Workload workload;
+  workload.in = std::make_unique<tessel::Raster>(inInfo, tessel::RasterContext(margin, margin));
+  workload.mask = MakeMask(*workload.in, pattern);
+  workload.out = std::make_unique<tessel::Raster>(outInfo, tessel::RasterContext());
+  workload.twin = std::make_unique<tessel::Raster>(outInfo, tessel::RasterContext());
+  return workload;
+}
+
+}  // namespace
+
+std::size_t Workload::BytesMoved() const {
+  return ImageBytes(*in) + ImageBytes(*out) + (mask != nullptr ? mask->bits.size() : 0);
+}
+
+template <class In, class Out, std::uint32_t channels, MaskPattern pattern>
+Workload Elevations(std::uint32_t size) {
+  Workload workload = MakeWorkload<In, Out>(size, channels, channels, 1, pattern);
+  const std::vector<Surface> surfaces = SurfacesFor(*workload.in);
+  Random random(1);
+  Fill<In>(*workload.in, [&](std::size_t x, std::size_t y, std::size_t c) {
+    return 1000.0f + surfaces[c].At(x, y) + Noise(random);
+  });
+  return workload;
+}
+
+template <class In, class Out, std::uint32_t channels, MaskPattern pattern>
+Workload Bands(std::uint32_t size) {
+  Workload workload = MakeWorkload<In, Out>(size, channels, 1, 0, pattern);
+  const std::vector<Surface> surfaces = SurfacesFor(*workload.in);
+  const float gain = sizeof(In) == 1 ? 1.0f : 40.0f;
+  Random random(1);
+  Fill<In>(*workload.in, [&](std::size_t x, std::size_t y, std::size_t c) {
+    const float sample = gain * (128.0f + 0.25f * surfaces[c].At(x, y) + 30.0f * Noise(random));
+    const bool collar = 20 * x + 2 * y < 3 * std::size_t{size};
+    return collar || random() % 4096 == 0 ? 0.0f : std::fmax(sample, 1.0f);
+  });
+  return workload;
+}
+
+template Workload Elevations<float, float, 1, MaskPattern::kNone>(std::uint32_t);
+template Workload Elevations<float, float, 3, MaskPattern::kRandom>(std::uint32_t);
+template Workload Elevations<float, float, 3, MaskPattern::kRuns>(std::uint32_t);
+template Workload Elevations<short, unsigned char, 1, MaskPattern::kNone>(std::uint32_t);
+template Workload Bands<unsigned char, unsigned char, 3, MaskPattern::kNone>(std::uint32_t);
+template Workload Bands<unsigned char, unsigned char, 3, MaskPattern::kRandom>(std::uint32_t);
+template Workload Bands<unsigned char, unsigned char, 3, MaskPattern::kRuns>(std::uint32_t);
+template Workload Bands<unsigned short, float, 4, MaskPattern::kNone>(std::uint32_t);
+
+}  // namespace orvik::bench

@@ -1,0 +1,57 @@
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <memory>
+
+#include "basic/tessel/mask/mask.h"
+#include "basic/tessel/raster.h"
+
+namespace orvik::bench {
+
+/// What the contestants of a row work on. They read `in` and `mask`; gridmill writes `out`, all others
+/// `twin`.
+struct Workload {
+  std::unique_ptr<tessel::Raster> in;
+  std::unique_ptr<tessel::Mask> mask;  ///< null: every pixel is valid
+  std::unique_ptr<tessel::Raster> out;
+  std::unique_ptr<tessel::Raster> twin;
+
+  std::size_t Pixels() const { return std::size_t{in->width} * in->height; }
+
+  /// Bytes that a pass has to move: the image areas of input and output, and the mask's bits.
+  std::size_t BytesMoved() const;
+};
+
+using WorkloadMaker = Workload (*)(std::uint32_t size);
+
+/// Half of the pixels valid, each by a toss, or in runs of 64 to 575 pixels.
+enum class MaskPattern { kNone, kRandom, kRuns };
+
+/// The distance of two neighbouring elevations, in the elevations' unit.
+inline constexpr float kSpacing = 10.0f;
+
+/// Hills of three wavelengths with a little noise, slopes from 0 to 60 degrees, and a margin of 1. The output
+/// has as many channels.
+template <class In, class Out, std::uint32_t channels, MaskPattern pattern = MaskPattern::kNone>
+Workload Elevations(std::uint32_t size);
+
+/// A textured scene with a slanting collar of no-data (0), a tenth of the image, and scattered samples of
+/// no-data. The output has one channel.
+template <class In, class Out, std::uint32_t channels, MaskPattern pattern = MaskPattern::kNone>
+Workload Bands(std::uint32_t size);
+
+/// The bit of pixel (x, y), tested as the text-book has it.
+inline bool IsValid(const tessel::Mask& mask, std::size_t x, std::size_t y) {
+  const std::size_t bit = (mask.marginY + y) * mask.bufferWidth + mask.marginX + x;
+  return (mask.bits[bit >> 3] >> (7 - (bit & 7)) & 1) != 0;
+}
+
+/// Sample 0 of pixel (0, y) of a raster whose type is known.
+template <class Pixel>
+Pixel* RowOf(const tessel::Raster& raster, std::size_t y) {
+  const std::size_t pixel = (raster.marginY + y) * raster.bufferWidth + raster.marginX;
+  return reinterpret_cast<Pixel*>(raster.data) + pixel * raster.channels;
+}
+
+}  // namespace orvik::bench
