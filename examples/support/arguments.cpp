@@ -1,0 +1,119 @@
+#include "arguments.h"
+
+#include <cmath>
+#include <cstdio>
+#include <cstdlib>
+#include <exception>
+
+#include "errors.h"
+
+namespace examples {
+
+namespace {
+
+bool ParseNumber(const std::string& text, double& value) {
+  char* end = nullptr;
+  value = std::strtod(text.c_str(), &end);
+  return !text.empty() && end == text.c_str() + text.size();
+}
+
+CLI::Validator NumberWith(const std::string& expected, bool (*accept)(double)) {
+  const auto check = [expected, accept](const std::string& text) {
+    double value = 0.0;
+    if (ParseNumber(text, value) && accept(value)) return std::string();
+    return "'" + text + "' is not usable; expected " + expected;
+  };
+  return CLI::Validator(check, "");
+}
+
+CLI::Validator OneOf(const std::vector<std::string>& names) {
+  const auto check = [names](const std::string& text) {
+    std::string list;
+    for (const std::string& name : names) {
+      if (text == name) return std::string();
+      list += (list.empty() ? "" : ", ") + name;
+    }
+    return "'" + text + "' is not usable; expected one of " + list;
+  };
+  return CLI::Validator(check, "");
+}
+
+}  // namespace
+
+CLI::Validator Count(std::uint32_t last) {
+  const auto check = [last](const std::string& text) {
+    double value = 0.0;
+    if (ParseNumber(text, value) && value == std::floor(value) && value >= 1.0 && value <= last)
+      return std::string();
+    return "'" + text + "' is not usable; expected a whole number from 1 to " + std::to_string(last);
+  };
+  return CLI::Validator(check, "");
+}
+
+CLI::Validator Number() {
+  return NumberWith("a finite number", [](double value) { return std::isfinite(value); });
+}
+
+CLI::Validator PositiveNumber() {
+  return NumberWith("a finite number above 0",
+                    [](double value) { return std::isfinite(value) && value > 0.0; });
+}
+
+void AddJobOptions(CLI::App& command, JobOptions& options, const std::string& notes) {
+  command.footer(
+      notes +
+      "\n"
+      "No-data: a pixel is left out where a no-data value, a mask band or an alpha band of INPUT\n"
+      "says so, and where a sample is NaN. OUTPUT keeps the georeference of INPUT, and appears\n"
+      "under its name only when it is complete.\n"
+      "\n"
+      "Exit status: 0 done; 2 an argument was refused and nothing was written; 1 the work failed.");
+  command.add_option("INPUT", options.input, "a raster that GDAL reads, of any pixel type")
+      ->type_name("FILE")
+      ->required();
+  command
+      .add_option("OUTPUT", options.output, "the GeoTIFF to write (.tif or .tiff); an old one is replaced")
+      ->type_name("FILE")
+      ->required();
+  command
+      .add_option("--type", options.type,
+                  "pixel type of OUTPUT: Byte, UInt16, Int16, UInt32, Int32,\n"
+                  "UInt64, Int64, Float32 (default) or Float64")
+      ->type_name("TYPE")
+      ->check(OneOf(OutputTypeNames()));
+  command
+      .add_option("--nodata", options.noData,
+                  "no-data value of OUTPUT; default: nan for floating types, else\n"
+                  "-32768 for Int16 and Int32, 255 for Byte, 65535 for the rest")
+      ->type_name("V")
+      ->check(NumberWith("a number or nan", [](double value) { return !std::isinf(value); }));
+  command
+      .add_option("--tile", options.tile,
+                  "side of the tiles in pixels, 512 by default; OUTPUT does not depend on it")
+      ->type_name("N")
+      ->check(Count(1u << 20));
+  command.add_option("--png", options.png, "also draw a picture of OUTPUT into this file (.png)")
+      ->type_name("FILE");
+  command.add_option("--title", options.title, "title of the picture")->type_name("TEXT");
+}
+
+int RunProgram(CLI::App& app, int argc, char** argv, const std::function<void()>& work) {
+  try {
+    app.parse(argc, argv);
+    StartGdal();
+    work();
+    return 0;
+  } catch (const CLI::ParseError& error) {
+    if (error.get_exit_code() == 0) return app.exit(error);
+    std::fprintf(stderr, "%s: %s\nRun with --help for more.\n", app.get_name().c_str(), error.what());
+    return 2;
+  } catch (const Refusal& error) {
+    std::fprintf(stderr, "%s: %s\n", app.get_name().c_str(), error.what());
+    return 2;
+  } catch (const std::exception& error) {
+    std::fprintf(stderr, "%s: %s\n", app.get_name().c_str(), error.what());
+    return 1;
+  }
+}
+
+}  // namespace examples

@@ -1,0 +1,30 @@
+#pragma once
+
+#include <cstdint>
+#include <functional>
+#include <string>
+
+#include <CLI/CLI.hpp>
+
+#include "job.h"
+
+namespace examples {
+
+/// Adds the arguments of `JobOptions` to a command, and `notes` to the end of its help.
+void AddJobOptions(CLI::App& command, JobOptions& options, const std::string& notes);
+
+/// Refuses anything but a whole number from 1 to `last`.
+CLI::Validator Count(std::uint32_t last);
+
+/// Refuses anything but a finite number.
+CLI::Validator Number();
+/// Refuses anything but a finite number above 0.
+CLI::Validator PositiveNumber();
+
+/// Parses the command line, runs `work` and turns what went wrong into a message on standard error.
+///
+/// Returns the exit status: 0 for done, 2 for an argument that was refused before anything was written, 1 for
+/// work that failed.
+int RunProgram(CLI::App& app, int argc, char** argv, const std::function<void()>& work);
+
+}  // namespace examples

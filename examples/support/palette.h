@@ -1,0 +1,25 @@
+#pragma once
+
+namespace examples {
+
+/// A colour of the sRGB space, each part from 0 to 1.
+struct Colour {
+  double red;
+  double green;
+  double blue;
+};
+
+/// A colour ramp takes a position from 0 to 1.
+using Ramp = Colour (*)(double position);
+
+/// Black to white.
+Colour GreyRamp(double position);
+
+/// From pale yellow over red to dark violet, evenly darker: for amounts.
+Colour HeatRamp(double position);
+
+/// A closed circle of hues, lightest at the north-west, as maps light their relief: for directions, 0 and 1
+/// being north.
+Colour CompassRamp(double position);
+
+}  // namespace examples

@@ -1,0 +1,26 @@
+#pragma once
+
+#include <cstdint>
+#include <string>
+
+#include "gdal.h"
+#include "quantity.h"
+
+namespace examples {
+
+/// The figures of a one-band raster, in the unit of its quantity.
+struct Summary {
+  std::uint64_t pixels = 0;
+  std::uint64_t valid = 0;
+  std::uint64_t flat = 0;  ///< valid pixels that have no direction; not in the figures below
+  double min = 0.0;
+  double mean = 0.0;  ///< of directions: the direction of their sum, from 0 to 360
+  double max = 0.0;
+};
+
+Summary Summarise(GDALDataset& dataset, const Quantity& quantity);
+
+/// "min 0.0, mean 2.1, max 11.3 degrees, 12321 of 12321 pixels valid"
+std::string Describe(const Summary& summary, const Quantity& quantity);
+
+}  // namespace examples

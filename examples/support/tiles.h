@@ -1,0 +1,61 @@
+#pragma once
+
+#include <cstdint>
+#include <memory>
+#include <string>
+#include <vector>
+
+#include "basic/tessel/mask/mask.h"
+#include "basic/tessel/raster.h"
+#include "gdal.h"
+
+namespace examples {
+
+/// A piece of an image, in pixels of the whole image.
+struct Tile {
+  std::uint32_t x;
+  std::uint32_t y;
+  std::uint32_t width;
+  std::uint32_t height;
+};
+
+/// Cuts an image into tiles of at most `side` x `side` pixels, row by row.
+std::vector<Tile> CutTiles(std::uint32_t width, std::uint32_t height, std::uint32_t side);
+
+/// A tile in memory as the operators take it. `mask` is null where every pixel is valid.
+struct LoadedTile {
+  std::unique_ptr<orvik::tessel::Raster> raster;
+  std::unique_ptr<orvik::tessel::Mask> mask;
+};
+
+/// Reads tiles of some bands in their own type, with a margin of neighbouring pixels around them.
+///
+/// The margin holds the pixels of the neighbouring tiles; beyond the image it repeats the nearest edge pixel,
+/// validity included. A pixel is invalid where GDAL's mask of one of the bands says so, which covers no-data
+/// values, alpha and mask bands, or where a floating sample is NaN.
+class TileReader {
+ public:
+  /// Bands count from 1. Bands of unlike types are read in the type that holds them all.
+  /// @throws Refusal if a tile of `side` x `side` pixels is larger than a raster can be
+  TileReader(GDALDataset& dataset, std::vector<int> bands, std::uint32_t margin, std::uint32_t side);
+
+  /// True if a pixel may be invalid.
+  bool Masked() const { return masked_; }
+
+  LoadedTile Read(const Tile& tile) const;
+
+ private:
+  struct Window;
+  Window InsideOf(const Tile& tile) const;
+  void ReadSamples(const Window& inside, orvik::tessel::Raster& raster) const;
+  std::vector<unsigned char> ReadValidity(const Window& inside, const orvik::tessel::Raster& raster) const;
+
+  GDALDataset& dataset_;
+  std::vector<int> bands_;
+  std::uint32_t margin_;
+  GDALDataType type_ = GDT_Unknown;
+  orvik::tessel::DataType dataType_;
+  bool masked_ = false;
+};
+
+}  // namespace examples
