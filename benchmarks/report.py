@@ -75,8 +75,8 @@ def main():
     arguments = parser.parse_args()
 
     rows = read_rows(arguments.results)
-    print("Mpixel/s; after each other contestant, how many times faster gridmill is. roof: a plain copy of as")
-    print("many bytes as the job reads and writes.")
+    print("Mpixel/s; after each other contestant, how many times faster gridmill is. roof: a plain copy of")
+    print("as many bytes as the job reads and writes.")
     print()
     print_table(rows)
     failures = [row for row in rows if row["failure"] is not None]

@@ -131,6 +131,7 @@ class AverageChannels::InnerProcessor : public IClipperProcessor, public details
       Out* const target = tessel::PixelAt<Out>(*out, 0, y);
       for (std::size_t x = 0; x < in->width; x += kBlock) {
         const std::size_t count = std::min<std::size_t>(kBlock, in->width - x);
+        kernels::PrefetchAhead(source + x * channels, count * channels);
         WriteMeanRow(source + x * channels, channels, value, count, target + x);
         if (inMask == nullptr) continue;
         unsigned char valid[kBlock];

@@ -98,6 +98,7 @@ struct AspRow {
   void Compute(std::size_t first, std::size_t count, float* aspect) const {
     CellScratch scratch;
     const std::size_t sample = first * channels;
+    kernels::PrefetchAhead(lower + sample, count * channels);
     const CellCorners z =
         kernels::LoadCorners(upper + sample, lower + sample, channels, channels, count, scratch);
     AspectScratch s;

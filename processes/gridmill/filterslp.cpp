@@ -98,6 +98,7 @@ struct SlpRow {
 
   /// `count` samples from the one with index `first` on, none of their cells masked.
   void Samples(std::size_t first, std::size_t count) const {
+    kernels::PrefetchAhead(lower + first, count);
     CellScratch scratch;
     float cosine[kBlock];
     const CellCorners z = kernels::LoadCorners(upper + first, lower + first, 1, channels, count, scratch);

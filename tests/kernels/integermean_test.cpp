@@ -145,7 +145,7 @@ TEST(MeanRow4, ANoDataOfNaNMatchesNothing) {
 }
 
 TEST(MeanRow4, NoDataIsFoundInEveryChannelAndNextToItsNeighbours) {
-  for (const unsigned short hit : {0, 1, 7, 0x7FFF, 0x8000, 0xFFFF}) {
+  for (const auto hit : std::vector<unsigned short>{0, 1, 7, 0x7FFF, 0x8000, 0xFFFF}) {
     for (std::size_t channel = 0; channel < 4; ++channel) {
       for (const int step : {-1, 1, 0x100, 0x8000}) {
         std::vector<unsigned short> source(4, static_cast<unsigned short>(hit + step));

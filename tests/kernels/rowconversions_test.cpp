@@ -122,7 +122,7 @@ TYPED_TEST(RowConversionsOf, LoadRowIsThePlainCastOfEveryStrideThSample) {
   using In = TypeParam;
   for (const std::size_t count : Counts()) {
     for (std::size_t stride = 1; stride <= kMaxStride; ++stride) {
-      for (const std::size_t start : {0, 1}) {
+      for (const std::size_t start : {0u, 1u}) {
         const std::size_t samples = count == 0 ? 0 : (count - 1) * stride + 1;
         const std::vector<In> source = AnyValues<In>(start + samples, this->random);
         std::vector<float> expected = Sentinels<float>(count + 2 * kGuard);
@@ -138,7 +138,7 @@ TYPED_TEST(RowConversionsOf, LoadRowIsThePlainCastOfEveryStrideThSample) {
 
 TYPED_TEST(RowConversionsOf, LoadRowStoresAtAnyAlignment) {
   using In = TypeParam;
-  for (const std::size_t offset : {1, 2, 3, 5, 7}) {
+  for (const std::size_t offset : {1u, 2u, 3u, 5u, 7u}) {
     const std::vector<In> source = AnyValues<In>(70, this->random);
     std::vector<float> expected = Sentinels<float>(offset + 70 + kGuard);
     std::vector<float> target = expected;
@@ -175,7 +175,7 @@ TEST(RowConversions, FloatRowLeavesADenseFloatRowWhereItStands) {
 template <class Value, class Out>
 void ExpectStoreClipped(std::mt19937_64& random) {
   for (const std::size_t count : Counts()) {
-    for (const std::size_t start : {0, 1}) {
+    for (const std::size_t start : {0u, 1u}) {
       const std::vector<Value> values = AnyValues<Value>(start + count, random);
       std::vector<Out> expected = Sentinels<Out>(start + count + 2 * kGuard);
       std::vector<Out> target = expected;
@@ -199,7 +199,7 @@ template <class Value, class Out>
 void ExpectStoreClippedWhere(std::mt19937_64& random) {
   constexpr unsigned char validity[] = {0, 0, 0, 1, 1, 1, 2, 255};
   for (const std::size_t count : Counts()) {
-    for (const std::size_t start : {0, 1}) {
+    for (const std::size_t start : {0u, 1u}) {
       const std::vector<Value> values = AnyValues<Value>(start + count, random);
       std::vector<unsigned char> valid(start + count);
       for (unsigned char& byte : valid) byte = validity[random() % std::size(validity)];

@@ -1,6 +1,7 @@
 #pragma once
 
 #include <cstddef>
+#include <cstdint>
 
 /// The staged row: samples are loaded as `float` into scratch that stays in the first-level cache, computed
 /// on, and stored as the output's type. One copy for all operators, built for several instruction sets.
@@ -8,6 +9,16 @@ namespace orvik::kernels {
 
 /// Pixels or samples that go through the stages together.
 inline constexpr std::size_t kBlock = 256;
+
+/// Asks for the samples three blocks of `count` ahead, which may lie beyond the buffer. Images in main memory
+/// gain.
+/// gain.
+template <class Sample>
+inline void PrefetchAhead(const Sample* block, std::size_t count) {
+  const auto ahead = reinterpret_cast<std::uintptr_t>(block) + 3 * count * sizeof(Sample);
+  for (std::size_t byte = 0; byte < count * sizeof(Sample); byte += 64)
+    __builtin_prefetch(reinterpret_cast<const void*>(ahead + byte));
+}
 
 /// Converts `count` samples, `stride` elements apart, to `float`.
 template <class In>

@@ -316,8 +316,9 @@ TEST_F(AverageChannelsFailure, ComplexOutputComesBeforeTheDispatcher) {
 // ---- differential
 
 float DrawNoData(tests::Random& random) {
-  constexpr float kValues[] = {0.0f,     -0.0f,  1.0f,   -1.0f, 2.0f,  2.5f,   -2.5f,     127.5f,     300.0f,
-                               -9999.0f, 5e-10f, 1e-40f, 3e9f,  1e20f, -1e20f, kInfinity, -kInfinity, kNaN};
+  constexpr float kValues[] = {3.0f,   7.0f, 255.0f, -128.0f, 32767.0f,  0.0f,       -0.0f,    1.0f,
+                               -1.0f,  2.0f, 2.5f,   -2.5f,   127.5f,    300.0f,     -9999.0f, 5e-10f,
+                               1e-40f, 3e9f, 1e20f,  -1e20f,  kInfinity, -kInfinity, kNaN};
   return random.Pick(kValues);
 }
 
