@@ -12,7 +12,6 @@ inline constexpr std::size_t kBlock = 256;
 
 /// Asks for the samples three blocks of `count` ahead, which may lie beyond the buffer. Images in main memory
 /// gain.
-/// gain.
 template <class Sample>
 inline void PrefetchAhead(const Sample* block, std::size_t count) {
   const auto ahead = reinterpret_cast<std::uintptr_t>(block) + 3 * count * sizeof(Sample);
