@@ -3,7 +3,7 @@
 #include <algorithm>
 #include <cstddef>
 #include <cstdint>
-#include <cstring>
+#include <initializer_list>
 #include <vector>
 
 #include "basic/tessel/datatype.h"

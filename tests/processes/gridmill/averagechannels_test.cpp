@@ -1,10 +1,10 @@
 #include "processes/gridmill/averagechannels.h"
 
+#include <algorithm>
 #include <cmath>
 #include <cstdint>
 #include <limits>
 #include <memory>
-#include <string>
 #include <thread>
 #include <vector>
 
@@ -26,10 +26,8 @@ using tessel::Raster;
 using tests::FillBytes;
 using tests::Image;
 using tests::IsUntouched;
-using tests::kSentinel;
 using tests::PixelType;
 using tests::Throws;
-using tests::WithPixelType;
 
 constexpr float kNaN = std::numeric_limits<float>::quiet_NaN();
 constexpr float kInfinity = std::numeric_limits<float>::infinity();

@@ -5,7 +5,6 @@
 #include <limits>
 #include <memory>
 #include <thread>
-#include <type_traits>
 #include <vector>
 
 #include <gtest/gtest.h>
@@ -28,7 +27,6 @@ using tests::Image;
 using tests::IsUntouched;
 using tests::PixelType;
 using tests::Throws;
-using tests::WithPixelType;
 
 constexpr float kNaN = std::numeric_limits<float>::quiet_NaN();
 constexpr float kInfinity = std::numeric_limits<float>::infinity();

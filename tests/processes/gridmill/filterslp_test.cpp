@@ -5,6 +5,7 @@
 #include <limits>
 #include <memory>
 #include <thread>
+#include <type_traits>
 #include <vector>
 
 #include <gtest/gtest.h>
