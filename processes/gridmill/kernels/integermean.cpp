@@ -29,15 +29,15 @@ GRIDMILL_INLINE void RoundedMeans3(const unsigned char* source, Bytes noData, By
   std::memcpy(&low, source, 16);
   std::memcpy(&middle, source + 16, 16);
   std::memcpy(&high, source + 32, 16);
-  const Bytes a = __builtin_shuffle(
-      __builtin_shuffle(low, middle, Bytes{0, 3, 6, 9, 12, 15, 18, 21, 24, 27, 30, 0, 0, 0, 0, 0}), high,
-      Bytes{0, 1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 17, 20, 23, 26, 29});
-  const Bytes b = __builtin_shuffle(
-      __builtin_shuffle(low, middle, Bytes{1, 4, 7, 10, 13, 16, 19, 22, 25, 28, 31, 0, 0, 0, 0, 0}), high,
-      Bytes{0, 1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 18, 21, 24, 27, 30});
-  const Bytes c = __builtin_shuffle(
-      __builtin_shuffle(low, middle, Bytes{2, 5, 8, 11, 14, 17, 20, 23, 26, 29, 0, 0, 0, 0, 0, 0}), high,
-      Bytes{0, 1, 2, 3, 4, 5, 6, 7, 8, 9, 16, 19, 22, 25, 28, 31});
+  const Bytes a = __builtin_shufflevector(
+      __builtin_shufflevector(low, middle, 0, 3, 6, 9, 12, 15, 18, 21, 24, 27, 30, 0, 0, 0, 0, 0), high, 0, 1,
+      2, 3, 4, 5, 6, 7, 8, 9, 10, 17, 20, 23, 26, 29);
+  const Bytes b = __builtin_shufflevector(
+      __builtin_shufflevector(low, middle, 1, 4, 7, 10, 13, 16, 19, 22, 25, 28, 31, 0, 0, 0, 0, 0), high, 0,
+      1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 18, 21, 24, 27, 30);
+  const Bytes c = __builtin_shufflevector(
+      __builtin_shufflevector(low, middle, 2, 5, 8, 11, 14, 17, 20, 23, 26, 29, 0, 0, 0, 0, 0, 0), high, 0, 1,
+      2, 3, 4, 5, 6, 7, 8, 9, 16, 19, 22, 25, 28, 31);
   const Words sum = __builtin_convertvector(a, Words) + __builtin_convertvector(b, Words) +
                     __builtin_convertvector(c, Words);
   const Bytes mean = __builtin_convertvector((sum + kRounding) / 3, Bytes);
