@@ -56,11 +56,11 @@ GRIDMILL_MULTIVERSION void AddChannel(const float* __restrict sample, float noDa
   }
 }
 
-GRIDMILL_MULTIVERSION void DivideSums(const int* __restrict hit, float divisor, float noData,
-                                      std::size_t count, float* __restrict sum) {
+GRIDMILL_MULTIVERSION void DivideSums(const float* __restrict sum, const int* __restrict hit, float divisor,
+                                      float noData, std::size_t count, float* __restrict mean) {
   for (std::size_t i = 0; i < count; ++i) {
-    const float mean = sum[i] / divisor;
-    sum[i] = hit[i] != 0 ? noData : mean;
+    const float quotient = sum[i] / divisor;
+    mean[i] = hit[i] != 0 ? noData : quotient;
   }
 }
 
@@ -68,11 +68,11 @@ GRIDMILL_MULTIVERSION void DivideSums(const int* __restrict hit, float divisor, 
 template <class In>
 void AnyMeanRow(const In* source, std::size_t channels, float noData, std::size_t count, float* mean) {
   float scratch[kBlock];
+  float sum[kBlock] = {};
   int hit[kBlock] = {};
-  std::fill_n(mean, count, 0.0f);
   for (std::size_t c = 0; c < channels; ++c)
-    AddChannel(kernels::FloatRow(source + c, channels, count, scratch), noData, count, mean, hit);
-  DivideSums(hit, static_cast<float>(channels), noData, count, mean);
+    AddChannel(kernels::FloatRow(source + c, channels, count, scratch), noData, count, sum, hit);
+  DivideSums(sum, hit, static_cast<float>(channels), noData, count, mean);
 }
 
 template <class In>
