@@ -5,8 +5,21 @@ set(GRIDMILL_SOURCES
     basic/tessel/mask/mask.cpp
     basic/tessel/raster.cpp
     processes/gridmill/averagechannels.cpp
+    processes/gridmill/chandiffchange.cpp
+    processes/gridmill/chandiffchange2.cpp
+    processes/gridmill/chanratiochange.cpp
+    processes/gridmill/chanratiochange2.cpp
+    processes/gridmill/combchange.cpp
     processes/gridmill/filterasp.cpp
     processes/gridmill/filterslp.cpp
+    processes/gridmill/intenratiochange.cpp
+    processes/gridmill/magnitudechange.cpp
+    processes/gridmill/singlechange.cpp
+    processes/gridmill/tasseledcapchange.cpp
+    processes/gridmill/frame/changerows.cpp
+    processes/gridmill/kernels/changenodata.cpp
+    processes/gridmill/kernels/channelratio.cpp
+    processes/gridmill/kernels/difference.cpp
     processes/gridmill/kernels/integermean.cpp
     processes/gridmill/kernels/maskedcells.cpp
     processes/gridmill/kernels/rowconversions.cpp
@@ -28,11 +41,23 @@ set(GRIDMILL_HEADERS
     basic/tessel/mask/maskdecision.h
     basic/tessel/raster.h
     processes/gridmill/averagechannels.h
+    processes/gridmill/chandiffchange.h
+    processes/gridmill/chandiffchange2.h
+    processes/gridmill/changeparams.h
+    processes/gridmill/chanratiochange.h
+    processes/gridmill/chanratiochange2.h
+    processes/gridmill/combchange.h
+    processes/gridmill/difftype.h
     processes/gridmill/filterasp.h
     processes/gridmill/filterslp.h
     processes/gridmill/frame/processorcache.h
     processes/gridmill/gridmill.h
-    processes/gridmill/iprocessor.h)
+    processes/gridmill/ichange.h
+    processes/gridmill/intenratiochange.h
+    processes/gridmill/iprocessor.h
+    processes/gridmill/magnitudechange.h
+    processes/gridmill/singlechange.h
+    processes/gridmill/tasseledcapchange.h)
 
 # gridmill_objects(<name> <isa>): the compiled sources for one setting of GRIDMILL_ISA.
 function(gridmill_objects name isa)

@@ -107,12 +107,6 @@ void WriteMeanRow(const In* source, std::size_t channels, float noData, std::siz
   }
 }
 
-template <class Out>
-GRIDMILL_MULTIVERSION void ReplaceMasked(const unsigned char* valid, Out masked, std::size_t count,
-                                         Out* __restrict target) {
-  for (std::size_t x = 0; x < count; ++x) target[x] = valid[x] != 0 ? target[x] : masked;
-}
-
 // ---- image
 
 }  // namespace
@@ -137,7 +131,7 @@ class AverageChannels::InnerProcessor : public IClipperProcessor, public details
         unsigned char valid[kBlock];
         tessel::UnpackBits(*inMask, tessel::PixelIndex(*inMask, static_cast<std::uint32_t>(x), y), count,
                            valid);
-        ReplaceMasked(valid, masked, count, target + x);
+        kernels::ReplaceMasked(valid, masked, count, target + x);
       }
     });
   }

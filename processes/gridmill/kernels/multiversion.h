@@ -14,5 +14,13 @@
 #define GRIDMILL_MULTIVERSION
 #endif
 
+/// In front of a loop whose iterations touch different elements, also where a target is one of the sources:
+/// an image may be computed in place. `__restrict` would promise too much there.
+#if defined(__clang__)
+#define GRIDMILL_INDEPENDENT _Pragma("clang loop vectorize(assume_safety)")
+#else
+#define GRIDMILL_INDEPENDENT _Pragma("GCC ivdep")
+#endif
+
 /// In front of the arithmetic that kernels share, so that each version gets its own copy.
 #define GRIDMILL_INLINE inline __attribute__((always_inline))

@@ -11,21 +11,21 @@ namespace orvik::kernels {
 
 namespace {
 
-template <std::size_t stride, class In>
-GRIDMILL_INLINE void LoadStrided(const In* __restrict source, std::size_t count, float* __restrict target) {
-  for (std::size_t i = 0; i < count; ++i) target[i] = tessel::PlainCast<float>(source[i * stride]);
+template <std::size_t stride, class In, class Value>
+GRIDMILL_INLINE void LoadStrided(const In* __restrict source, std::size_t count, Value* __restrict target) {
+  for (std::size_t i = 0; i < count; ++i) target[i] = tessel::PlainCast<Value>(source[i * stride]);
 }
 
 }  // namespace
 
-template <class In>
+template <class In, class Value>
 GRIDMILL_MULTIVERSION void LoadRow(const In* __restrict source, std::size_t stride, std::size_t count,
-                                   float* __restrict target) {
+                                   Value* __restrict target) {
   if (stride == 1) return LoadStrided<1>(source, count, target);
   if (stride == 2) return LoadStrided<2>(source, count, target);
   if (stride == 3) return LoadStrided<3>(source, count, target);
   if (stride == 4) return LoadStrided<4>(source, count, target);
-  for (std::size_t i = 0; i < count; ++i) target[i] = tessel::PlainCast<float>(source[i * stride]);
+  for (std::size_t i = 0; i < count; ++i) target[i] = tessel::PlainCast<Value>(source[i * stride]);
 }
 
 template <class In>
@@ -35,6 +35,12 @@ const float* FloatRow(const In* source, std::size_t stride, std::size_t count, f
   }
   LoadRow(source, stride, count, scratch);
   return scratch;
+}
+
+template <class Value, class Out>
+GRIDMILL_MULTIVERSION void StoreCast(const Value* __restrict values, std::size_t count,
+                                     Out* __restrict target) {
+  for (std::size_t i = 0; i < count; ++i) target[i] = tessel::PlainCast<Out>(values[i]);
 }
 
 template <class Value, class Out>
@@ -53,14 +59,46 @@ GRIDMILL_MULTIVERSION void StoreClippedWhere(const Value* __restrict values,
   }
 }
 
-#define GRIDMILL_ROW_CONVERSIONS(Type)                                                                \
-  template void LoadRow<Type>(const Type*, std::size_t, std::size_t, float*);                         \
-  template const float* FloatRow<Type>(const Type*, std::size_t, std::size_t, float*);                \
-  template void StoreClipped<float, Type>(const float*, std::size_t, Type*);                          \
-  template void StoreClipped<int, Type>(const int*, std::size_t, Type*);                              \
-  template void StoreClippedWhere<float, Type>(const float*, const unsigned char*, Type, std::size_t, \
-                                               Type*);                                                \
-  template void StoreClippedWhere<int, Type>(const int*, const unsigned char*, Type, std::size_t, Type*)
+template <class Out>
+GRIDMILL_MULTIVERSION void ReplaceMasked(const unsigned char* __restrict valid, Out other, std::size_t count,
+                                         Out* __restrict target) {
+  for (std::size_t i = 0; i < count; ++i) target[i] = valid[i] != 0 ? target[i] : other;
+}
+
+template <std::size_t samples, class Sample>
+GRIDMILL_MULTIVERSION void StorePixels(const Sample (&planes)[samples][kBlock], std::size_t count,
+                                       Sample* __restrict target) {
+  for (std::size_t i = 0; i < count; ++i)
+    for (std::size_t c = 0; c < samples; ++c) target[i * samples + c] = planes[c][i];
+}
+
+#define GRIDMILL_STORES(Value, Out)                                     \
+  template void StoreCast<Value, Out>(const Value*, std::size_t, Out*); \
+  template void StoreClipped<Value, Out>(const Value*, std::size_t, Out*)
+
+#define GRIDMILL_STORES_WHERE(Value, Out) \
+  template void StoreClippedWhere<Value, Out>(const Value*, const unsigned char*, Out, std::size_t, Out*)
+
+#define GRIDMILL_ROW_CONVERSIONS(Type)                                                 \
+  template void LoadRow<Type, float>(const Type*, std::size_t, std::size_t, float*);   \
+  template void LoadRow<Type, double>(const Type*, std::size_t, std::size_t, double*); \
+  template const float* FloatRow<Type>(const Type*, std::size_t, std::size_t, float*); \
+  template void StorePixels(const Type(&)[3][kBlock], std::size_t, Type*);             \
+  template void StorePixels(const Type(&)[4][kBlock], std::size_t, Type*);             \
+  template void ReplaceMasked<Type>(const unsigned char*, Type, std::size_t, Type*);   \
+  GRIDMILL_STORES(char, Type);                                                         \
+  GRIDMILL_STORES(unsigned char, Type);                                                \
+  GRIDMILL_STORES(short, Type);                                                        \
+  GRIDMILL_STORES(unsigned short, Type);                                               \
+  GRIDMILL_STORES(int, Type);                                                          \
+  GRIDMILL_STORES(unsigned int, Type);                                                 \
+  GRIDMILL_STORES(float, Type);                                                        \
+  GRIDMILL_STORES(double, Type);                                                       \
+  GRIDMILL_STORES(std::int64_t, Type);                                                 \
+  GRIDMILL_STORES(std::uint64_t, Type);                                                \
+  GRIDMILL_STORES_WHERE(float, Type);                                                  \
+  GRIDMILL_STORES_WHERE(double, Type);                                                 \
+  GRIDMILL_STORES_WHERE(int, Type)
 
 GRIDMILL_ROW_CONVERSIONS(char);
 GRIDMILL_ROW_CONVERSIONS(unsigned char);
@@ -74,5 +112,7 @@ GRIDMILL_ROW_CONVERSIONS(std::int64_t);
 GRIDMILL_ROW_CONVERSIONS(std::uint64_t);
 
 #undef GRIDMILL_ROW_CONVERSIONS
+#undef GRIDMILL_STORES_WHERE
+#undef GRIDMILL_STORES
 
 }  // namespace orvik::kernels

@@ -1,0 +1,15 @@
+#pragma once
+
+#include <cstddef>
+
+/// Differences in the samples' own arithmetic: integers wrap modulo their range and never saturate.
+namespace orvik::kernels {
+
+enum class Difference { kAbsolute, kForward, kBackward };
+
+/// Differences of `count` samples, of which a target may be one of the sources. Forward is a - b; absolute is
+/// a - b where a >= b, else b - a; backward is b - a, of floating samples 0 - (a - b).
+template <class Sample>
+void DifferenceRow(const Sample* a, const Sample* b, Difference form, std::size_t count, Sample* target);
+
+}  // namespace orvik::kernels
