@@ -21,6 +21,7 @@ set(GRIDMILL_SOURCES
     processes/gridmill/kernels/channelratio.cpp
     processes/gridmill/kernels/difference.cpp
     processes/gridmill/kernels/integermean.cpp
+    processes/gridmill/kernels/logarithm.cpp
     processes/gridmill/kernels/maskedcells.cpp
     processes/gridmill/kernels/rowconversions.cpp
     processes/gridmill/kernels/wholedegrees.cpp)
@@ -66,12 +67,10 @@ function(gridmill_objects name isa)
                                            VISIBILITY_INLINES_HIDDEN ON)
   target_include_directories(${name} PUBLIC ${PROJECT_SOURCE_DIR})
   target_link_libraries(${name} PRIVATE gridmill_numerics gridmill_warnings OpenMP::OpenMP_CXX)
-  if(isa STREQUAL "x86-64")
-    target_compile_definitions(${name} PRIVATE GRIDMILL_ISA_LEVEL=1)
-  elseif(isa STREQUAL "x86-64-v3")
-    target_compile_definitions(${name} PRIVATE GRIDMILL_ISA_LEVEL=3)
-  elseif(isa STREQUAL "x86-64-v4")
-    target_compile_definitions(${name} PRIVATE GRIDMILL_ISA_LEVEL=4)
+  if(isa MATCHES "^x86-64(-v[34])?$")
+    # By flags, not attributes: g++ drops the attribute of a template that was declared without it.
+    target_compile_definitions(${name} PRIVATE GRIDMILL_PINNED)
+    target_compile_options(${name} PRIVATE -march=${isa})
   elseif(NOT isa STREQUAL "auto")
     message(FATAL_ERROR "GRIDMILL_ISA is '${isa}'; expected auto, x86-64, x86-64-v3 or x86-64-v4")
   endif()

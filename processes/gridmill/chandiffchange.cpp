@@ -1,6 +1,7 @@
 #include "processes/gridmill/chandiffchange.h"
 
 #include <cstddef>
+#include <type_traits>
 #include <vector>
 
 #include "basic/tessel/clipto.h"
@@ -52,6 +53,12 @@ class ChanDiffChange::InnerProcessor : public IChange, public details::ChanDiffP
 
     frame::ChangeRows<In, In, Out>({*image, *reference, *out, mask}, shape, [&](const auto& block) {
       const std::size_t count = block.pixels * channels;
+      if constexpr (std::is_same_v<kernels::NoDataKey<In>, Out> && std::is_same_v<In, Out>) {
+        if (choice.ImageKeys() != nullptr)
+          return kernels::TestedDifferenceRow(block.image, choice.ImageKeys(), block.reference,
+                                              choice.ReferenceKeys(), choice.MaskOf(block), form, excluded,
+                                              count, block.target);
+      }
       const unsigned char* const keep = choice.Of(block);
       DifferenceOfCasts(block.image, block.reference, form, count, scratch.data(), block.target);
       if (keep != nullptr) kernels::ReplaceMasked(keep, excluded, count, block.target);

@@ -24,6 +24,10 @@ using kernels::kBlock;
 /// The square of a sample in its own arithmetic, that of `int` for 8 and 16 bits.
 /// Deliberate: it wraps there, so that it can be negative.
 struct Square {
+  /// True if `int` holds the sum of four squares.
+  template <class In>
+  static constexpr bool kFitsInt = sizeof(In) == 1;
+
   template <class In>
   GRIDMILL_INLINE static auto Of(In sample) {
     if constexpr (std::is_floating_point_v<In>) {
@@ -37,13 +41,14 @@ struct Square {
   }
 };
 
+struct Root {
+  GRIDMILL_INLINE double Of(double sum) const { return std::sqrt(sum); }
+};
+
 // ---- row
 
-/// Turns the sums of squares into magnitudes, and fills in their differences.
-GRIDMILL_MULTIVERSION void MagnitudeRow(DiffType type, std::size_t count, double* __restrict A,
-                                        double* __restrict B, double* __restrict C) {
-  for (std::size_t i = 0; i < count; ++i) A[i] = std::sqrt(A[i]);
-  for (std::size_t i = 0; i < count; ++i) B[i] = std::sqrt(B[i]);
+GRIDMILL_MULTIVERSION void MagnitudeDifferenceRow(const double* __restrict A, const double* __restrict B,
+                                                  DiffType type, std::size_t count, double* __restrict C) {
   if (type == eDIFF_ABSOLUTE) {
     for (std::size_t i = 0; i < count; ++i) C[i] = std::fabs(A[i] - B[i]);
   } else if (type == eDIFF_FORWARD) {
@@ -70,10 +75,11 @@ class MagnitudeChange::InnerProcessor : public IChange, public details::Magnitud
     const frame::BlockShape shape = frame::PixelBlocks(m, n, 3);
     frame::ChangeRows<In, In, Out>({*image, *reference, *out, mask}, shape, [&](const auto& block) {
       double planes[3][kBlock];
+      auto& [A, B, C] = planes;
       const unsigned char* const keep = choice.Of(block);
-      kernels::SumRow<Square>(block.image, block.imageStride, m, block.pixels, planes[0]);
-      kernels::SumRow<Square>(block.reference, block.referenceStride, n, block.pixels, planes[1]);
-      MagnitudeRow(type, block.pixels, planes[0], planes[1], planes[2]);
+      kernels::SumRow<Square>(block.image, block.imageStride, m, Root{}, block.pixels, A);
+      kernels::SumRow<Square>(block.reference, block.referenceStride, n, Root{}, block.pixels, B);
+      MagnitudeDifferenceRow(A, B, type, block.pixels, C);
       kernels::StorePixelsWhere(planes, keep, excluded, block.pixels, block.target);
     });
   }

@@ -14,7 +14,8 @@ namespace orvik::changedetection {
 
 namespace {
 
-using kernels::kBlock;
+/// Samples whose `float` forms stay in the first-level cache together.
+constexpr std::size_t kPixels = 1024;
 
 // ---- row
 
@@ -37,7 +38,7 @@ GRIDMILL_MULTIVERSION void SingleRow(const float* i, const float* r, DiffType ty
 template <class In, class Out>
 void WriteSingleRow(const In* image, std::size_t imageStride, const In* reference,
                     std::size_t referenceStride, DiffType type, std::size_t count, Out* target) {
-  float imageScratch[kBlock], referenceScratch[kBlock], d[kBlock];
+  float imageScratch[kPixels], referenceScratch[kPixels], d[kPixels];
   const float* const i = kernels::FloatRow(image, imageStride, count, imageScratch);
   const float* const r = kernels::FloatRow(reference, referenceStride, count, referenceScratch);
   if constexpr (std::is_same_v<Out, float>) {
@@ -57,7 +58,8 @@ class SingleChange::InnerProcessor : public IChange, public details::SingleParam
  public:
   void Process(tessel::Raster* image, tessel::Raster* reference, tessel::Mask* mask,
                tessel::Raster* out) const override {
-    const frame::BlockShape shape = frame::PixelBlocks(1, 1, 1);
+    frame::BlockShape shape = frame::PixelBlocks(1, 1, 1);
+    shape.pixels = kPixels;
     frame::ChangeRows<In, In, Out>({*image, *reference, *out, mask}, shape, [&](const auto& block) {
       WriteSingleRow(block.image, block.imageStride, block.reference, block.referenceStride, type,
                      block.pixels, block.target);

@@ -110,8 +110,7 @@ void ProjectRow(const In* first, std::size_t stride, const Sensor& sensor, std::
                                ProjectBands<Order::kMss, 4>};
   constexpr Project kSix[] = {ProjectBands<Order::kRunning, 6>, ProjectBands<Order::kVisibleFirst, 6>};
   Bands planes;
-  for (std::size_t band = 0; band < sensor.bands; ++band)
-    kernels::LoadRow(first + band, stride, count, planes[band]);
+  kernels::LoadPlanes(first, stride, sensor.bands, count, planes);
   const auto order = static_cast<std::size_t>(sensor.order);
   (sensor.bands == 4 ? kFour[order] : kSix[order])(planes, sensor.weights, count, projection);
 }

@@ -4,6 +4,10 @@
 #include <cstring>
 #include <vector>
 
+#ifdef __SSE2__
+#include <emmintrin.h>
+#endif
+
 #include "basic/tessel/mask/maskrow.h"
 #include "basic/tessel/samples.h"
 #include "processes/gridmill/frame/rows.h"
@@ -59,19 +63,38 @@ class PixelReader {
   std::vector<unsigned char> gathered_;
 };
 
+/// Outputs of more bytes than this are written past the caches, which they would not fit into: the lines need
+/// not be read first.
+constexpr std::uint64_t kStreamedBytes = std::uint64_t{32} << 20;
+
+void StreamBytes(const unsigned char* source, std::size_t count, unsigned char* target) {
+#ifdef __SSE2__
+  const std::size_t head = std::min(count, -reinterpret_cast<std::uintptr_t>(target) % sizeof(__m128i));
+  std::memcpy(target, source, head);
+  std::size_t i = head;
+  for (; i + sizeof(__m128i) <= count; i += sizeof(__m128i))
+    _mm_stream_si128(reinterpret_cast<__m128i*>(target + i),
+                     _mm_loadu_si128(reinterpret_cast<const __m128i*>(source + i)));
+  std::memcpy(target + i, source + i, count - i);
+#else
+  std::memcpy(target, source, count);
+#endif
+}
+
 /// Takes the samples of an output's pixels.
 class PixelWriter {
  public:
   PixelWriter(const Raster& raster, const DataType& element, const BlockShape& shape)
       : raster_(raster),
         bytes_(shape.outSamples * BytesOf(element)),
-        pixelBytes_(ElementsOf(raster) * BytesOf(element)) {
-    if (!InPlace()) scattered_.resize(shape.pixels * bytes_);
+        pixelBytes_(ElementsOf(raster) * BytesOf(element)),
+        streams_(pixelBytes_ == bytes_ && raster.dataSize > kStreamedBytes) {
+    if (!InPlace()) block_.resize(shape.pixels * bytes_);
   }
 
   /// Where the samples of the pixels from (x, y) on are to be put.
   unsigned char* At(std::uint32_t x, std::uint32_t y) {
-    return InPlace() ? raster_.data + PixelOffset(raster_, x, y) : scattered_.data();
+    return InPlace() ? raster_.data + PixelOffset(raster_, x, y) : block_.data();
   }
 
   /// Called when they are there. Pixels are written in their order: where one has fewer samples than are
@@ -79,29 +102,43 @@ class PixelWriter {
   void Write(std::uint32_t x, std::uint32_t y, std::size_t pixels) const {
     if (InPlace() || bytes_ == 0) return;
     unsigned char* const row = raster_.data + PixelOffset(raster_, x, y);
+    if (streams_) return StreamBytes(block_.data(), pixels * bytes_, row);
     for (std::size_t i = 0; i < pixels; ++i)
-      std::memcpy(row + i * pixelBytes_, scattered_.data() + i * bytes_, bytes_);
+      std::memcpy(row + i * pixelBytes_, block_.data() + i * bytes_, bytes_);
+  }
+
+  /// Called when all are written: other threads see streamed bytes only after it.
+  void Finish() const {
+#ifdef __SSE2__
+    if (streams_) _mm_sfence();
+#endif
   }
 
  private:
-  bool InPlace() const { return pixelBytes_ == bytes_; }
+  bool InPlace() const { return pixelBytes_ == bytes_ && !streams_; }
 
   const Raster& raster_;
   std::size_t bytes_;  // of a pixel that are written
   std::size_t pixelBytes_;
-  std::vector<unsigned char> scattered_;
+  bool streams_;
+  std::vector<unsigned char> block_;
 };
 
-/// Fills `valid` for the pixels from (x, y) on; returns whether one of them is excluded.
+/// Fills `valid` for the pixels from (x, y) on if there is a mask; returns whether one of them is excluded.
 bool UnpackMasks(const TwoDates& dates, std::uint32_t x, std::uint32_t y, std::size_t pixels,
                  unsigned char* valid) {
-  std::fill_n(valid, pixels, static_cast<unsigned char>(1));
-  if (dates.mask != nullptr)
-    tessel::UnpackBits(*dates.mask, tessel::PixelIndex(*dates.mask, x, y), pixels, valid);
+  const auto unpack = [&](const tessel::Mask& mask, unsigned char* bits) {
+    tessel::UnpackBits(mask, tessel::PixelIndex(mask, x, y), pixels, bits);
+  };
+  if (dates.mask == nullptr && dates.referenceMask == nullptr) return false;
+  if (dates.mask != nullptr) {
+    unpack(*dates.mask, valid);
+  } else {
+    std::fill_n(valid, pixels, static_cast<unsigned char>(1));
+  }
   if (dates.referenceMask != nullptr) {
     unsigned char excluded[kMaxBlock];
-    const tessel::Mask& mask = *dates.referenceMask;
-    tessel::UnpackBits(mask, tessel::PixelIndex(mask, x, y), pixels, excluded);
+    unpack(*dates.referenceMask, excluded);
     for (std::size_t i = 0; i < pixels; ++i) valid[i] &= static_cast<unsigned char>(excluded[i] ^ 1);
   }
   return std::memchr(valid, 0, pixels) != nullptr;
@@ -126,6 +163,7 @@ void WalkBlocks(const TwoDates& dates, const BlockShape& shape, const ElementTyp
       out.Write(x, y, pixels);
     }
   });
+  out.Finish();
 }
 
 }  // namespace orvik::frame

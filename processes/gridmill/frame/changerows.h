@@ -21,7 +21,9 @@ struct TwoDates {
   const tessel::Mask* referenceMask = nullptr;  ///< deliberate: a set bit excludes the pixel
 };
 
-inline constexpr std::size_t kMaxBlock = 256;
+/// Pixels of a block at most, and of one whose pixels are single results.
+inline constexpr std::size_t kMaxBlock = 4096;
+inline constexpr std::size_t kPixelBlock = 256;
 
 /// How an operator takes its pixels.
 struct BlockShape {
@@ -32,17 +34,18 @@ struct BlockShape {
   bool dense;              ///< the samples of a block follow each other without others between
 };
 
-/// For operators that treat each sample by itself: the same number of samples in all three, of which a block
-/// of many channels holds fewer pixels.
+/// For operators that treat each sample by itself: the same number of samples in all three rasters, and
+/// blocks of few thousand samples, in whole vectors where pixels are not large.
 inline BlockShape SampleBlocks(std::size_t channels) {
-  const std::size_t pixels = channels <= 4 ? kMaxBlock : std::max<std::size_t>(1, 4 * kMaxBlock / channels);
-  return {pixels, channels, channels, channels, true};
+  const std::size_t pixels = kMaxBlock / std::max<std::size_t>(channels, 1);
+  return {pixels >= 64 ? pixels & ~std::size_t{63} : std::max<std::size_t>(pixels, 1), channels, channels,
+          channels, true};
 }
 
 /// For operators that make one result of all samples of a pixel.
 inline BlockShape PixelBlocks(std::size_t imageSamples, std::size_t referenceSamples,
                               std::size_t outSamples) {
-  return {kMaxBlock, imageSamples, referenceSamples, outSamples, false};
+  return {kPixelBlock, imageSamples, referenceSamples, outSamples, false};
 }
 
 /// Pixels of one row, as a row function gets them.
@@ -53,8 +56,8 @@ struct Block {
   const Ref* reference;
   std::size_t referenceStride;
   std::size_t pixels;
-  unsigned char* valid;  ///< one byte of 0 or 1 for each pixel, which the row function may clear
-  bool masked;           ///< false: every byte of `valid` is 1
+  unsigned char* valid;  ///< room for one byte of 0 or 1 for each pixel, the row function's to write
+  bool masked;           ///< true: a byte is 0; false: all pixels are valid and the bytes are not set
   Out* target;           ///< `outSamples` for each pixel, one after the other
 };
 

@@ -1,8 +1,8 @@
 #pragma once
 
+#include <algorithm>
 #include <cstddef>
 #include <type_traits>
-#include <vector>
 
 #include "basic/tessel/clipto.h"
 #include "processes/gridmill/kernels/changenodata.h"
@@ -24,31 +24,37 @@ class ChannelRatios {
       : absolute_(absolute),
         channels_(channels),
         excluded_(tessel::ClipTo<Out>(params.noData)),
-        choice_(params, channels, pixels),
-        scratch_(3 * channels * pixels) {}
+        choice_(params, channels, pixels) {}
 
   template <class Block>
   void operator()(const Block& block) {
     const std::size_t count = block.pixels * channels_;
     const unsigned char* const keep = choice_.Of(block);
-    float* const scratch = scratch_.data();
-    const float* const image = FloatRow(block.image, 1, count, scratch);
-    const float* const reference = FloatRow(block.reference, 1, count, scratch + count);
-    if constexpr (std::is_same_v<Out, float>) {
-      RatioRow(image, reference, absolute_, count, block.target);
-    } else {
-      RatioRow(image, reference, absolute_, count, scratch + 2 * count);
-      StoreClipped(scratch + 2 * count, count, block.target);
-    }
+    for (std::size_t i = 0; i < count; i += kChunk)
+      WriteRatios(block.image + i, block.reference + i, std::min(kChunk, count - i), block.target + i);
     if (keep != nullptr) ReplaceMasked(keep, excluded_, count, block.target);
   }
 
  private:
+  /// Samples whose `float` forms stay in the first-level cache together.
+  static constexpr std::size_t kChunk = 1024;
+
+  void WriteRatios(const In* image, const Ref* reference, std::size_t count, Out* target) const {
+    float imageScratch[kChunk], referenceScratch[kChunk], q[kChunk];
+    const float* const i = FloatRow(image, 1, count, imageScratch);
+    const float* const r = FloatRow(reference, 1, count, referenceScratch);
+    if constexpr (std::is_same_v<Out, float>) {
+      RatioRow(i, r, absolute_, count, target);
+    } else {
+      RatioRow(i, r, absolute_, count, q);
+      StoreClipped(q, count, target);
+    }
+  }
+
   bool absolute_;
   std::size_t channels_;
   Out excluded_;
   SampleChoice<In, Ref> choice_;
-  std::vector<float> scratch_;
 };
 
 }  // namespace orvik::kernels

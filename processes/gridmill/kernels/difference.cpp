@@ -33,21 +33,50 @@ GRIDMILL_INLINE Sample BackwardDifference(Sample a, Sample b) {
   return Subtract(b, a);
 }
 
+template <Difference form, class Sample>
+GRIDMILL_INLINE Sample DifferenceOf(Sample a, Sample b) {
+  if constexpr (form == Difference::kAbsolute) return AbsoluteDifference(a, b);
+  if constexpr (form == Difference::kForward) return Subtract(a, b);
+  return BackwardDifference(a, b);
+}
+
+template <Difference form, class Sample>
+GRIDMILL_MULTIVERSION void FormRow(const Sample* a, const Sample* b, std::size_t count, Sample* target) {
+  GRIDMILL_INDEPENDENT
+  for (std::size_t i = 0; i < count; ++i) target[i] = DifferenceOf<form>(a[i], b[i]);
+}
+
+template <Difference form, class Sample>
+GRIDMILL_MULTIVERSION void TestedFormRow(const Sample* a, const Sample* aKeys, const Sample* b,
+                                         const Sample* bKeys, const unsigned char* keep, Sample excluded,
+                                         std::size_t count, Sample* target) {
+  GRIDMILL_INDEPENDENT
+  for (std::size_t i = 0; i < count; ++i) {
+    const Sample difference = DifferenceOf<form>(a[i], b[i]);
+    const bool kept = (keep[i] != 0) & (a[i] != aKeys[i]) & (b[i] != bKeys[i]);
+    target[i] = kept ? difference : excluded;
+  }
+}
+
 }  // namespace
 
 template <class Sample>
-GRIDMILL_MULTIVERSION void DifferenceRow(const Sample* a, const Sample* b, Difference form, std::size_t count,
-                                         Sample* target) {
-  if (form == Difference::kAbsolute) {
-    GRIDMILL_INDEPENDENT
-    for (std::size_t i = 0; i < count; ++i) target[i] = AbsoluteDifference(a[i], b[i]);
-  } else if (form == Difference::kForward) {
-    GRIDMILL_INDEPENDENT
-    for (std::size_t i = 0; i < count; ++i) target[i] = Subtract(a[i], b[i]);
-  } else {
-    GRIDMILL_INDEPENDENT
-    for (std::size_t i = 0; i < count; ++i) target[i] = BackwardDifference(a[i], b[i]);
-  }
+void DifferenceRow(const Sample* a, const Sample* b, Difference form, std::size_t count, Sample* target) {
+  if (form == Difference::kAbsolute) return FormRow<Difference::kAbsolute>(a, b, count, target);
+  if (form == Difference::kForward) return FormRow<Difference::kForward>(a, b, count, target);
+  FormRow<Difference::kBackward>(a, b, count, target);
+}
+
+template <class Sample>
+void TestedDifferenceRow(const Sample* a, const Sample* aKeys, const Sample* b, const Sample* bKeys,
+                         const unsigned char* keep, Difference form, Sample excluded, std::size_t count,
+                         Sample* target) {
+  using Row = void (*)(const Sample*, const Sample*, const Sample*, const Sample*, const unsigned char*,
+                       Sample, std::size_t, Sample*);
+  const Row row = form == Difference::kAbsolute  ? TestedFormRow<Difference::kAbsolute, Sample>
+                  : form == Difference::kForward ? TestedFormRow<Difference::kForward, Sample>
+                                                 : TestedFormRow<Difference::kBackward, Sample>;
+  row(a, aKeys, b, bKeys, keep, excluded, count, target);
 }
 
 template void DifferenceRow(const char*, const char*, Difference, std::size_t, char*);
@@ -63,5 +92,18 @@ template void DifferenceRow(const double*, const double*, Difference, std::size_
 template void DifferenceRow(const std::int64_t*, const std::int64_t*, Difference, std::size_t, std::int64_t*);
 template void DifferenceRow(const std::uint64_t*, const std::uint64_t*, Difference, std::size_t,
                             std::uint64_t*);
+
+template void TestedDifferenceRow(const char*, const char*, const char*, const char*, const unsigned char*,
+                                  Difference, char, std::size_t, char*);
+template void TestedDifferenceRow(const unsigned char*, const unsigned char*, const unsigned char*,
+                                  const unsigned char*, const unsigned char*, Difference, unsigned char,
+                                  std::size_t, unsigned char*);
+template void TestedDifferenceRow(const short*, const short*, const short*, const short*,
+                                  const unsigned char*, Difference, short, std::size_t, short*);
+template void TestedDifferenceRow(const unsigned short*, const unsigned short*, const unsigned short*,
+                                  const unsigned short*, const unsigned char*, Difference, unsigned short,
+                                  std::size_t, unsigned short*);
+template void TestedDifferenceRow(const float*, const float*, const float*, const float*,
+                                  const unsigned char*, Difference, float, std::size_t, float*);
 
 }  // namespace orvik::kernels

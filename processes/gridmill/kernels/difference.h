@@ -12,4 +12,11 @@ enum class Difference { kAbsolute, kForward, kBackward };
 template <class Sample>
 void DifferenceRow(const Sample* a, const Sample* b, Difference form, std::size_t count, Sample* target);
 
+/// The same where `keep` is not 0 and neither sample is equal to its key; `excluded` elsewhere. For 8-bit,
+/// 16-bit and `float` samples.
+template <class Sample>
+void TestedDifferenceRow(const Sample* a, const Sample* aKeys, const Sample* b, const Sample* bKeys,
+                         const unsigned char* keep, Difference form, Sample excluded, std::size_t count,
+                         Sample* target);
+
 }  // namespace orvik::kernels

@@ -1,14 +1,9 @@
 #pragma once
 
 /// `GRIDMILL_MULTIVERSION` in front of a kernel builds it for several instruction sets, of which the loader
-/// picks the best that the processor has. `GRIDMILL_ISA_LEVEL` (1, 3 or 4: x86-64, -v3, -v4) pins one
-/// instead. Other compilers and processors build each kernel once, plainly. The results are the same bits
-/// everywhere.
-#if defined(GRIDMILL_ISA_LEVEL) && GRIDMILL_ISA_LEVEL == 4
-#define GRIDMILL_MULTIVERSION __attribute__((target("arch=x86-64-v4")))
-#elif defined(GRIDMILL_ISA_LEVEL) && GRIDMILL_ISA_LEVEL == 3
-#define GRIDMILL_MULTIVERSION __attribute__((target("arch=x86-64-v3")))
-#elif !defined(GRIDMILL_ISA_LEVEL) && defined(__x86_64__) && defined(__GNUC__) && !defined(__clang__)
+/// picks the best that the processor has. `GRIDMILL_PINNED` leaves the choice to the compiler's flags. Other
+/// compilers and processors build each kernel once, plainly. The results are the same bits everywhere.
+#if !defined(GRIDMILL_PINNED) && defined(__x86_64__) && defined(__GNUC__) && !defined(__clang__)
 #define GRIDMILL_MULTIVERSION __attribute__((target_clones("default", "arch=x86-64-v3", "arch=x86-64-v4")))
 #else
 #define GRIDMILL_MULTIVERSION
