@@ -1,0 +1,14 @@
+#pragma once
+
+#include "basic/tessel/mask/mask.h"
+#include "basic/tessel/raster.h"
+#include "tests/support/changecases.h"
+
+namespace orvik::reference {
+
+/// The ratio of two dates channel by channel with a mask each, slowly: one sample after the other.
+void ChanRatioChange(const tests::ChangeParameters& parameters, const tessel::Raster& image,
+                     const tessel::Raster& reference, const tessel::Mask* imageMask,
+                     const tessel::Mask* referenceMask, tessel::Raster& out);
+
+}  // namespace orvik::reference
