@@ -2,6 +2,7 @@
 #include <cstdint>
 #include <cstdio>
 #include <cstring>
+#include <regex>
 #include <string>
 #include <vector>
 
@@ -24,12 +25,16 @@ struct Size {
 /// A tile that stays in the second-level cache, and an image in DRAM.
 constexpr Size kSizes[] = {{512, 25, 2000}, {4096, 9, 100}};
 
-void RegisterRow(const Row& row, const Size& size, bool quick) {
+/// Counts the benchmarks that it registers: those whose "job/types/size" the filter matches.
+int RegisterRow(const Row& row, const Size& size, bool quick, const std::regex& filter) {
   using Measure = void (*)(benchmark::State&, const Row&, std::uint32_t);
   const int share = quick ? 3 : 1;
+  int registered = 0;
   const auto add = [&](const std::string& job, Measure measure, int iterations) {
     const std::string edge = std::to_string(size.edge);
     const std::string name = job + "/" + row.types + "/" + edge + "x" + edge;
+    if (!std::regex_search(name, filter)) return;
+    ++registered;
     const auto run = [&row, edge = size.edge, measure](benchmark::State& state) {
       measure(state, row, edge);
     };
@@ -38,12 +43,18 @@ void RegisterRow(const Row& row, const Size& size, bool quick) {
   add(row.job, MeasureRow, size.rounds / share);
   if (row.twoThreads && omp_get_num_procs() > 1)
     add(row.job + std::string(", 2 threads"), MeasureTwoThreads, size.callsOfTwoThreads / share);
+  return registered;
 }
 
-void RegisterRows(bool quick) {
-  for (const auto rows : {FilterSlpRows(), FilterAspRows(), AverageChannelsRows()})
+int RegisterRows(bool quick, const std::regex& filter) {
+  int registered = 0;
+  for (const auto rows :
+       {FilterSlpRows(), FilterAspRows(), AverageChannelsRows(), SingleChangeRows(), ChanDiffChangeRows(),
+        ChanDiffChange2Rows(), ChanRatioChangeRows(), ChanRatioChange2Rows(), CombChangeRows(),
+        IntenRatioChangeRows(), MagnitudeChangeRows(), TasseledCapChangeRows()})
     for (const Row& row : rows)
-      for (const Size& size : kSizes) RegisterRow(row, size, quick);
+      for (const Size& size : kSizes) registered += RegisterRow(row, size, quick, filter);
+  return registered;
 }
 
 /// Names each row on the standard error when it is done; the results go to the file of --benchmark_out.
@@ -66,6 +77,18 @@ bool TakeQuick(int& count, char** arguments) {
   return false;
 }
 
+/// Runs the rows that the filter names. The library would match its own names, which go on with
+/// "/iterations:...": "ratio" and "time" occur in each of them.
+int Run(bool quick, const std::string& filter) {
+  if (RegisterRows(quick, std::regex(filter, std::regex::extended)) == 0) {
+    std::fprintf(stderr, "no row matches '%s'\n", filter.c_str());
+    return 2;
+  }
+  Progress progress;
+  benchmark::RunSpecifiedBenchmarks(&progress, std::string("."));
+  return 0;
+}
+
 }  // namespace
 
 }  // namespace orvik::bench
@@ -73,9 +96,13 @@ bool TakeQuick(int& count, char** arguments) {
 int main(int argc, char** argv) {
   const bool quick = orvik::bench::TakeQuick(argc, argv);
   if (quick) orvik::bench::SetSlice(0.005);
-  orvik::bench::RegisterRows(quick);
   benchmark::Initialize(&argc, argv);
   if (benchmark::ReportUnrecognizedArguments(argc, argv)) return 2;
-  orvik::bench::Progress progress;
-  return benchmark::RunSpecifiedBenchmarks(&progress) > 0 ? 0 : 2;
+  const std::string filter = benchmark::GetBenchmarkFilter();
+  try {
+    return orvik::bench::Run(quick, filter);
+  } catch (const std::regex_error&) {
+    std::fprintf(stderr, "'%s' is not a regular expression\n", filter.c_str());
+    return 2;
+  }
 }

@@ -22,7 +22,16 @@ struct Row {
 };
 
 std::span<const Row> AverageChannelsRows();
+std::span<const Row> ChanDiffChangeRows();
+std::span<const Row> ChanDiffChange2Rows();
+std::span<const Row> ChanRatioChangeRows();
+std::span<const Row> ChanRatioChange2Rows();
+std::span<const Row> CombChangeRows();
 std::span<const Row> FilterAspRows();
 std::span<const Row> FilterSlpRows();
+std::span<const Row> IntenRatioChangeRows();
+std::span<const Row> MagnitudeChangeRows();
+std::span<const Row> SingleChangeRows();
+std::span<const Row> TasseledCapChangeRows();
 
 }  // namespace orvik::bench

@@ -85,6 +85,25 @@ std::size_t ImageBytes(const tessel::Raster& raster) {
   return std::size_t{raster.width} * raster.height * raster.channels * (raster.dataType.sizeBits / 8);
 }
 
+bool IsInCollar(std::size_t x, std::size_t y, std::size_t size) { return 20 * x + 2 * y < 3 * size; }
+
+/// How much brighter a field of 64 x 64 pixels is at the second date.
+float Change(std::size_t x, std::size_t y) { return (5 * (x / 64) + 3 * (y / 64)) % 8 == 0 ? 30.0f : 0.0f; }
+
+template <class Pixel>
+void FillDate(tessel::Raster& raster, bool second) {
+  const std::vector<Surface> surfaces = SurfacesFor(raster);
+  const float gain = sizeof(Pixel) == 1 ? 1.0f : 40.0f;
+  Random texture(1);
+  Random sensor(second ? 4 : 3);
+  Fill<Pixel>(raster, [&](std::size_t x, std::size_t y, std::size_t c) {
+    const float scene = 100.0f + 0.25f * surfaces[c].At(x, y) + 20.0f * Noise(texture);
+    const float sample = gain * (scene + (second ? Change(x, y) : 0.0f) + 5.0f * Noise(sensor));
+    const bool dead = IsInCollar(x, y, raster.width) || sensor() % 4096 == 0;
+    return dead ? 0.0f : std::fmax(sample, 1.0f);
+  });
+}
+
 template <class In, class Out>
 Workload MakeWorkload(std::uint32_t size, std::uint32_t inChannels, std::uint32_t outChannels,
                       std::uint32_t margin, MaskPattern pattern) {
@@ -101,7 +120,8 @@ Workload MakeWorkload(std::uint32_t size, std::uint32_t inChannels, std::uint32_
 }  // namespace
 
 std::size_t Workload::BytesMoved() const {
-  return ImageBytes(*in) + ImageBytes(*out) + (mask != nullptr ? mask->bits.size() : 0);
+  return ImageBytes(*in) + (reference != nullptr ? ImageBytes(*reference) : 0) + ImageBytes(*out) +
+         (mask != nullptr ? mask->bits.size() : 0);
 }
 
 template <class In, class Out, std::uint32_t channels, MaskPattern pattern>
@@ -123,9 +143,19 @@ Workload Bands(std::uint32_t size) {
   Random random(1);
   Fill<In>(*workload.in, [&](std::size_t x, std::size_t y, std::size_t c) {
     const float sample = gain * (128.0f + 0.25f * surfaces[c].At(x, y) + 30.0f * Noise(random));
-    const bool collar = 20 * x + 2 * y < 3 * std::size_t{size};
-    return collar || random() % 4096 == 0 ? 0.0f : std::fmax(sample, 1.0f);
+    return IsInCollar(x, y, size) || random() % 4096 == 0 ? 0.0f : std::fmax(sample, 1.0f);
   });
+  return workload;
+}
+
+template <class In, class Ref, class Out, std::uint32_t channels, std::uint32_t outChannels,
+          MaskPattern pattern>
+Workload Dates(std::uint32_t size) {
+  Workload workload = MakeWorkload<In, Out>(size, channels, outChannels, 0, pattern);
+  const tessel::RasterInfo info(size, size, channels, tessel::DataType::Of<Ref>());
+  workload.reference = std::make_unique<tessel::Raster>(info, tessel::RasterContext());
+  FillDate<In>(*workload.in, false);
+  FillDate<Ref>(*workload.reference, true);
   return workload;
 }
 
@@ -137,5 +167,19 @@ template Workload Bands<unsigned char, unsigned char, 3, MaskPattern::kNone>(std
 template Workload Bands<unsigned char, unsigned char, 3, MaskPattern::kRandom>(std::uint32_t);
 template Workload Bands<unsigned char, unsigned char, 3, MaskPattern::kRuns>(std::uint32_t);
 template Workload Bands<unsigned short, float, 4, MaskPattern::kNone>(std::uint32_t);
+template Workload Dates<unsigned char, unsigned char, unsigned char, 3, 3, MaskPattern::kNone>(std::uint32_t);
+template Workload Dates<unsigned char, unsigned char, unsigned char, 3, 3, MaskPattern::kRandom>(
+    std::uint32_t);
+template Workload Dates<unsigned char, unsigned char, unsigned char, 3, 3, MaskPattern::kRuns>(std::uint32_t);
+template Workload Dates<unsigned char, unsigned char, unsigned char, 3, 6, MaskPattern::kNone>(std::uint32_t);
+template Workload Dates<unsigned char, unsigned char, float, 3, 3, MaskPattern::kNone>(std::uint32_t);
+template Workload Dates<unsigned char, unsigned char, float, 3, 4, MaskPattern::kNone>(std::uint32_t);
+template Workload Dates<unsigned short, unsigned short, unsigned short, 4, 4, MaskPattern::kNone>(
+    std::uint32_t);
+template Workload Dates<unsigned short, unsigned short, float, 4, 3, MaskPattern::kNone>(std::uint32_t);
+template Workload Dates<unsigned short, unsigned short, float, 4, 4, MaskPattern::kNone>(std::uint32_t);
+template Workload Dates<unsigned short, unsigned short, float, 6, 3, MaskPattern::kNone>(std::uint32_t);
+template Workload Dates<short, unsigned short, float, 1, 1, MaskPattern::kNone>(std::uint32_t);
+template Workload Dates<float, float, float, 1, 1, MaskPattern::kNone>(std::uint32_t);
 
 }  // namespace orvik::bench

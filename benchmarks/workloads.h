@@ -9,17 +9,18 @@
 
 namespace orvik::bench {
 
-/// What the contestants of a row work on. They read `in` and `mask`; gridmill writes `out`, all others
-/// `twin`.
+/// What the contestants of a row work on. They read `in`, `reference` and `mask`; gridmill writes `out`, all
+/// others `twin`.
 struct Workload {
   std::unique_ptr<tessel::Raster> in;
-  std::unique_ptr<tessel::Mask> mask;  ///< null: every pixel is valid
+  std::unique_ptr<tessel::Raster> reference;  ///< null: the job has one input
+  std::unique_ptr<tessel::Mask> mask;         ///< null: every pixel is valid
   std::unique_ptr<tessel::Raster> out;
   std::unique_ptr<tessel::Raster> twin;
 
   std::size_t Pixels() const { return std::size_t{in->width} * in->height; }
 
-  /// Bytes that a pass has to move: the image areas of input and output, and the mask's bits.
+  /// Bytes that a pass has to move: the image areas of inputs and output, and the mask's bits.
   std::size_t BytesMoved() const;
 };
 
@@ -40,6 +41,12 @@ Workload Elevations(std::uint32_t size);
 /// no-data. The output has one channel.
 template <class In, class Out, std::uint32_t channels, MaskPattern pattern = MaskPattern::kNone>
 Workload Bands(std::uint32_t size);
+
+/// Two dates of a textured scene: the same surfaces and texture, an eighth of the fields brighter in the
+/// reference, sensor noise, and samples of no-data (0) as in `Bands`.
+template <class In, class Ref, class Out, std::uint32_t channels, std::uint32_t outChannels,
+          MaskPattern pattern = MaskPattern::kNone>
+Workload Dates(std::uint32_t size);
 
 /// The bit of pixel (x, y), tested as the text-book has it.
 inline bool IsValid(const tessel::Mask& mask, std::size_t x, std::size_t y) {

@@ -12,6 +12,11 @@ namespace orvik::bench {
 GRIDMILL_PEER void OpenCvSlope(const Workload& work);
 GRIDMILL_PEER void OpenCvAspect(const Workload& work);
 GRIDMILL_PEER void OpenCvMean(const Workload& work);
+GRIDMILL_PEER void OpenCvDifference(const Workload& work);
+GRIDMILL_PEER void OpenCvUnlikeDifference(const Workload& work);
+GRIDMILL_PEER void OpenCvRatio(const Workload& work);
+GRIDMILL_PEER void OpenCvCombination(const Workload& work);
+GRIDMILL_PEER void OpenCvDecibels(const Workload& work);
 
 GRIDMILL_PEER void GdalSlope(const Workload& work);
 GRIDMILL_PEER void GdalAspect(const Workload& work);
