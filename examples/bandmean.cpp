@@ -63,7 +63,7 @@ void FillMasked(const Mask& mask, double noData, GDALDataType type, Raster& out)
 void Run(const MeanOptions& options) {
   const examples::DatasetPtr input = OpenInput(options);
   const std::vector<int> bands = BandsOf(options, *input);
-  const examples::TileReader reader(*input, bands, 0, options.tile);
+  const examples::TileReader reader({.dataset = *input, .bands = bands}, 0, options.tile);
   // No sample equals NaN: the mask alone decides what is no-data.
   orvik::filters::AverageChannels mean(std::numeric_limits<float>::quiet_NaN());
   const Quantity quantity = {

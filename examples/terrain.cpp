@@ -84,7 +84,7 @@ Spacing SpacingOf(const TerrainOptions& options, GDALDataset& input) {
 
 examples::TileReader ReaderFor(const TerrainOptions& options, GDALDataset& input) {
   examples::CheckBand("--band", input, options.band);
-  return examples::TileReader(input, {options.band}, margin, options.tile);
+  return examples::TileReader({.dataset = input, .bands = {options.band}}, margin, options.tile);
 }
 
 void RunSlope(const TerrainOptions& options) {
@@ -96,7 +96,7 @@ void RunSlope(const TerrainOptions& options) {
                                   static_cast<float>(options.zFactor));
   slope.SetBackground(static_cast<float>(options.NoData()));
   RunJob(options, *input, reader, {.name = "slope", .unit = "degrees", .noData = options.NoData()},
-         {.ramp = examples::HeatRamp, .fromZero = true},
+         {.ramp = examples::HeatRamp, .span = examples::Span::fromZero},
          [&](LoadedTile& in, Raster& out) { slope.Process(in.raster.get(), in.mask.get(), &out); });
 }
 

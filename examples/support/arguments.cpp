@@ -26,18 +26,6 @@ CLI::Validator NumberWith(const std::string& expected, bool (*accept)(double)) {
   return CLI::Validator(check, "");
 }
 
-CLI::Validator OneOf(const std::vector<std::string>& names) {
-  const auto check = [names](const std::string& text) {
-    std::string list;
-    for (const std::string& name : names) {
-      if (text == name) return std::string();
-      list += (list.empty() ? "" : ", ") + name;
-    }
-    return "'" + text + "' is not usable; expected one of " + list;
-  };
-  return CLI::Validator(check, "");
-}
-
 }  // namespace
 
 CLI::Validator Count(std::uint32_t last) {
@@ -59,32 +47,32 @@ CLI::Validator PositiveNumber() {
                     [](double value) { return std::isfinite(value) && value > 0.0; });
 }
 
-void AddJobOptions(CLI::App& command, JobOptions& options, const std::string& notes) {
+CLI::Validator OneOf(const std::vector<std::string>& names) {
+  const auto check = [names](const std::string& text) {
+    std::string list;
+    for (const std::string& name : names) {
+      if (text == name) return std::string();
+      list += (list.empty() ? "" : ", ") + name;
+    }
+    return "'" + text + "' is not usable; expected one of " + list;
+  };
+  return CLI::Validator(check, "");
+}
+
+void AddOutputOptions(CLI::App& command, OutputOptions& options, const OutputTypes& types,
+                      const std::string& notes) {
   command.footer(
       notes +
       "\n"
-      "No-data: a pixel is left out where a no-data value, a mask band or an alpha band of INPUT\n"
-      "says so, and where a sample is NaN. OUTPUT keeps the georeference of INPUT, and appears\n"
-      "under its name only when it is complete.\n"
-      "\n"
       "Exit status: 0 done; 2 an argument was refused and nothing was written; 1 the work failed.");
-  command.add_option("INPUT", options.input, "a raster that GDAL reads, of any pixel type")
-      ->type_name("FILE")
-      ->required();
   command
       .add_option("OUTPUT", options.output, "the GeoTIFF to write (.tif or .tiff); an old one is replaced")
       ->type_name("FILE")
       ->required();
-  command
-      .add_option("--type", options.type,
-                  "pixel type of OUTPUT: Byte, UInt16, Int16, UInt32, Int32,\n"
-                  "UInt64, Int64, Float32 (default) or Float64")
+  command.add_option("--type", options.type, "pixel type of OUTPUT: " + types.help)
       ->type_name("TYPE")
-      ->check(OneOf(OutputTypeNames()));
-  command
-      .add_option("--nodata", options.noData,
-                  "no-data value of OUTPUT; default: nan for floating types, else\n"
-                  "-32768 for Int16 and Int32, 255 for Byte, 65535 for the rest")
+      ->check(OneOf(types.names));
+  command.add_option("--nodata", options.noData, "no-data value of OUTPUT; default: " + types.noDataHelp)
       ->type_name("V")
       ->check(NumberWith("a number or nan", [](double value) { return !std::isinf(value); }));
   command
@@ -95,6 +83,23 @@ void AddJobOptions(CLI::App& command, JobOptions& options, const std::string& no
   command.add_option("--png", options.png, "also draw a picture of OUTPUT into this file (.png)")
       ->type_name("FILE");
   command.add_option("--title", options.title, "title of the picture")->type_name("TEXT");
+}
+
+void AddJobOptions(CLI::App& command, JobOptions& options, const std::string& notes) {
+  command.add_option("INPUT", options.input, "a raster that GDAL reads, of any pixel type")
+      ->type_name("FILE")
+      ->required();
+  AddOutputOptions(
+      command, options,
+      {.names = OutputTypeNames(),
+       .help = "Byte, UInt16, Int16, UInt32, Int32,\nUInt64, Int64, Float32 (default) or Float64",
+       .noDataHelp = "nan for floating types, else\n"
+                     "-32768 for Int16 and Int32, 255 for Byte, 65535 for the rest"},
+      notes +
+          "\n"
+          "No-data: a pixel is left out where a no-data value, a mask band or an alpha band of INPUT\n"
+          "says so, and where a sample is NaN. OUTPUT keeps the georeference of INPUT, and appears\n"
+          "under its name only when it is complete.\n");
 }
 
 int RunProgram(CLI::App& app, int argc, char** argv, const std::function<void()>& work) {

@@ -3,6 +3,7 @@
 #include <cstdint>
 #include <functional>
 #include <string>
+#include <vector>
 
 #include <CLI/CLI.hpp>
 
@@ -10,11 +11,25 @@
 
 namespace examples {
 
+/// The pixel types that a command writes, and what its help says about them.
+struct OutputTypes {
+  std::vector<std::string> names;
+  std::string help;
+  std::string noDataHelp;  ///< the no-data values that they have unless stated
+};
+
+/// Adds the arguments of `OutputOptions` to a command, and `notes` to the end of its help.
+void AddOutputOptions(CLI::App& command, OutputOptions& options, const OutputTypes& types,
+                      const std::string& notes);
+
 /// Adds the arguments of `JobOptions` to a command, and `notes` to the end of its help.
 void AddJobOptions(CLI::App& command, JobOptions& options, const std::string& notes);
 
 /// Refuses anything but a whole number from 1 to `last`.
 CLI::Validator Count(std::uint32_t last);
+
+/// Refuses anything but one of the names.
+CLI::Validator OneOf(const std::vector<std::string>& names);
 
 /// Refuses anything but a finite number.
 CLI::Validator Number();

@@ -50,7 +50,7 @@ DatasetPtr OpenRaster(const std::string& argument, const std::string& path) {
   return dataset;
 }
 
-DataType TypeOf(GDALDataType type) {
+DataType TypeOf(GDALDataType type, const std::string& argument) {
   switch (type) {
     case GDT_Byte:
       return DataType::Of<unsigned char>();
@@ -81,7 +81,7 @@ DataType TypeOf(GDALDataType type) {
     default:
       break;
   }
-  throw Refusal("INPUT", std::string("has samples of type ") + GDALGetDataTypeName(type),
+  throw Refusal(argument, std::string("has samples of type ") + GDALGetDataTypeName(type),
                 "integers or floating point numbers");
 }
 

@@ -25,8 +25,8 @@ void ThrowOnGdalError(const std::string& doing, CPLErr result = CE_None);
 /// Opens a raster for reading. @throws Refusal naming `argument`
 DatasetPtr OpenRaster(const std::string& argument, const std::string& path);
 
-/// The library's type for a band's samples.
-orvik::tessel::DataType TypeOf(GDALDataType type);
+/// The library's type for a band's samples. @throws Refusal naming `argument`
+orvik::tessel::DataType TypeOf(GDALDataType type, const std::string& argument = "INPUT");
 
 /// The GDAL type for `--type`: one of the library's pixel types that GDAL has, none of them complex.
 GDALDataType OutputType(const std::string& name);

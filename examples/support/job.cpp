@@ -1,5 +1,6 @@
 #include "job.h"
 
+#include <algorithm>
 #include <cctype>
 #include <cmath>
 #include <cstdio>
@@ -40,73 +41,105 @@ std::string Capitalised(std::string text) {
   return text;
 }
 
-// Texts that were not stated are made from the input.
-PictureStyle Labelled(PictureStyle style, const JobOptions& options, GDALDataset& input,
-                      const Quantity& quantity) {
-  const std::filesystem::path path(options.input);
-  style.title =
-      !options.title.empty() ? options.title : Capitalised(quantity.name) + ", " + path.stem().string();
-  style.caption = path.filename().string() + ": " +
-                  CPLSPrintf("%d x %d pixels", input.GetRasterXSize(), input.GetRasterYSize()) +
-                  DescribeCells(input);
-  return style;
+// A raster in memory counts its bytes in 32 bits.
+void CheckTileSize(const Job& job) {
+  const auto extent = [&](int size) {
+    return std::min<std::uint64_t>(static_cast<std::uint64_t>(size), job.options.tile);
+  };
+  const std::uint64_t pixels = extent(job.grid.GetRasterXSize()) * extent(job.grid.GetRasterYSize());
+  const std::uint64_t pixelBytes = job.bands.size() * TypeOf(job.options.OutputType()).sizeBits / 8;
+  if (pixels * pixelBytes > INT32_MAX)
+    throw Refusal("--tile", "a tile of side " + std::to_string(job.options.tile) + " takes more than 2 GiB",
+                  "a smaller one");
+}
+
+// The time that it took, in seconds.
+double WriteTiles(const Job& job, OutputRaster& output, const TileWork& work) {
+  const auto width = static_cast<std::uint32_t>(job.grid.GetRasterXSize());
+  const auto height = static_cast<std::uint32_t>(job.grid.GetRasterYSize());
+  const auto channels = static_cast<std::uint32_t>(job.bands.size());
+  const std::vector<Tile> tiles = CutTiles(width, height, job.options.tile);
+  Progress progress(job.bands[job.shown].name, tiles.size());
+  for (const Tile& tile : tiles) {
+    Raster out(RasterInfo(tile.width, tile.height, channels, output.Type()), {});
+    work(tile, out);
+    output.Write(tile, out);
+    progress.Step();
+  }
+  output.Close();
+  return progress.Seconds();
 }
 
 }  // namespace
 
-double JobOptions::NoData() const { return noData.value_or(DefaultNoData(OutputType())); }
+double OutputOptions::NoData() const { return noData.value_or(DefaultNoData(OutputType())); }
 
 DatasetPtr OpenInput(const JobOptions& options) {
   DatasetPtr input = OpenRaster("INPUT", options.input);
-  std::vector<std::string> taken = FilesOf(*input);
-  CheckTarget("OUTPUT", options.output, taken, {".tif", ".tiff"});
-  taken.push_back(options.output);
-  if (!options.png.empty()) CheckTarget("--png", options.png, taken, {".png"});
-  CheckStorable("--nodata", options.NoData(), options.OutputType());
+  CheckOutputs(options, {input.get()}, options.NoData());
   return input;
 }
 
-void CheckBand(const std::string& argument, GDALDataset& dataset, int band) {
-  const int bands = dataset.GetRasterCount();
-  if (band >= 1 && band <= bands) return;
-  throw Refusal(argument, "there is no band " + std::to_string(band),
-                bands == 1 ? "1, as INPUT has one band" : "a band from 1 to " + std::to_string(bands));
+void CheckOutputs(const OutputOptions& options, const std::vector<GDALDataset*>& inputs, double noData) {
+  std::vector<std::string> taken;
+  for (GDALDataset* input : inputs)
+    for (const std::string& file : FilesOf(*input)) taken.push_back(file);
+  CheckTarget("OUTPUT", options.output, taken, {".tif", ".tiff"});
+  taken.push_back(options.output);
+  if (!options.png.empty()) CheckTarget("--png", options.png, taken, {".png"});
+  CheckStorable("--nodata", noData, options.OutputType());
 }
 
-void RunJob(const JobOptions& options, GDALDataset& input, const TileReader& reader, const Quantity& quantity,
-            const PictureStyle& style, const TileOperation& operation) {
+void CheckBand(const std::string& argument, GDALDataset& dataset, int band, const std::string& input) {
+  const int bands = dataset.GetRasterCount();
+  if (band >= 1 && band <= bands) return;
+  throw Refusal(
+      argument, "there is no band " + std::to_string(band) + " in " + input,
+      bands == 1 ? "1, as " + input + " has one band" : "a band from 1 to " + std::to_string(bands));
+}
+
+std::string DescribeGrid(const std::string& what, GDALDataset& dataset) {
+  return what + ": " + CPLSPrintf("%d x %d pixels", dataset.GetRasterXSize(), dataset.GetRasterYSize()) +
+         DescribeCells(dataset);
+}
+
+void RunJob(const Job& job, const TileWork& work) {
+  const OutputOptions& options = job.options;
+  const Quantity& quantity = job.bands[job.shown];
+  const int band = static_cast<int>(job.shown) + 1;
+  CheckTileSize(job);
   PendingFile file("OUTPUT", options.output);
   std::optional<PendingFile> picture;
   if (!options.png.empty()) picture.emplace("--png", options.png);
 
-  const auto width = static_cast<std::uint32_t>(input.GetRasterXSize());
-  const auto height = static_cast<std::uint32_t>(input.GetRasterYSize());
-  const std::vector<Tile> tiles = CutTiles(width, height, options.tile);
-  OutputRaster output(file, input, options.OutputType(), quantity);
-  double seconds = 0.0;
-  {
-    Progress progress(quantity.name, tiles.size());
-    for (const Tile& tile : tiles) {
-      LoadedTile in = reader.Read(tile);
-      Raster out(RasterInfo(tile.width, tile.height, 1, output.Type()), {});
-      operation(in, out);
-      output.Write(tile, out);
-      progress.Step();
-    }
-    output.Close();
-    seconds = progress.Seconds();
-  }
+  OutputRaster output(file, job.grid, options.OutputType(), job.bands);
+  const double seconds = WriteTiles(job, output, work);
 
   const DatasetPtr written(
       GDALDataset::Open(file.TemporaryPath().c_str(), GDAL_OF_RASTER | GDAL_OF_VERBOSE_ERROR));
   ThrowOnGdalError("reading back '" + options.output + "'", written ? CE_None : CE_Failure);
-  const Summary summary = Summarise(*written, quantity);
-  if (picture)
-    DrawPicture(*written, quantity, Labelled(style, options, input, quantity), picture->TemporaryPath());
+  const Summary summary = Summarise(*written->GetRasterBand(band), quantity);
+  if (picture) DrawPicture(*written, band, quantity, job.style, picture->TemporaryPath());
   file.Commit();
   if (picture) picture->Commit();
-  std::printf("%s: %s, %u x %u %s, %s, in %.3f s\n", options.output.c_str(), quantity.name.c_str(), width,
-              height, options.type.c_str(), Describe(summary, quantity).c_str(), seconds);
+  std::string name = quantity.name;
+  if (job.bands.size() > 1) name += CPLSPrintf(" (band %d of %zu)", band, job.bands.size());
+  std::printf("%s: %s, %d x %d %s, %s, in %.3f s\n", options.output.c_str(), name.c_str(),
+              job.grid.GetRasterXSize(), job.grid.GetRasterYSize(), options.type.c_str(),
+              Describe(summary, quantity).c_str(), seconds);
+}
+
+void RunJob(const JobOptions& options, GDALDataset& input, const TileReader& reader, const Quantity& quantity,
+            PictureStyle style, const TileOperation& operation) {
+  const std::filesystem::path path(options.input);
+  style.title =
+      !options.title.empty() ? options.title : Capitalised(quantity.name) + ", " + path.stem().string();
+  style.caption = DescribeGrid(path.filename().string(), input);
+  RunJob({.options = options, .grid = input, .bands = {quantity}, .style = style},
+         [&](const Tile& tile, Raster& out) {
+           LoadedTile in = reader.Read(tile);
+           operation(in, out);
+         });
 }
 
 }  // namespace examples

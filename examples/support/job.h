@@ -4,6 +4,7 @@
 #include <functional>
 #include <optional>
 #include <string>
+#include <vector>
 
 #include "basic/tessel/raster.h"
 #include "gdal.h"
@@ -13,33 +14,59 @@
 
 namespace examples {
 
-/// What every program of this folder is told: where to read, where to write and in which form.
-struct JobOptions {
-  std::string input;
+/// What every program of this folder is told: where to write and in which form.
+struct OutputOptions {
   std::string output;
   std::string type = "Float32";
   std::uint32_t tile = 512;
   std::optional<double> noData;  ///< none: the default of the output's type
   std::string png;               ///< empty: no picture
-  std::string title;             ///< empty: made from the quantity and the input's name
+  std::string title;             ///< empty: made from the quantity and the names of the inputs
 
   GDALDataType OutputType() const { return examples::OutputType(type); }
   double NoData() const;  ///< as stated, or the default
+};
+
+/// What a program with one input is told.
+struct JobOptions : OutputOptions {
+  std::string input;
 };
 
 /// Opens the input and refuses what cannot be done with it: an output that is one of its files, a no-data
 /// value that does not fit into the output.
 DatasetPtr OpenInput(const JobOptions& options);
 
-/// Refuses a band that the raster does not have.
-void CheckBand(const std::string& argument, GDALDataset& dataset, int band);
+/// Refuses outputs that are files of the inputs, and a no-data value that does not fit into the output.
+void CheckOutputs(const OutputOptions& options, const std::vector<GDALDataset*>& inputs, double noData);
+
+/// Refuses a band that the raster, which `input` names, does not have.
+void CheckBand(const std::string& argument, GDALDataset& dataset, int band,
+               const std::string& input = "INPUT");
+
+/// "dem.tif: 83 x 61 pixels, cells of 30 x 25 m"
+std::string DescribeGrid(const std::string& what, GDALDataset& dataset);
+
+/// What is to be written.
+struct Job {
+  const OutputOptions& options;
+  GDALDataset& grid;            ///< gives the output its size and its georeference
+  std::vector<Quantity> bands;  ///< of the output, all with the same no-data value
+  std::size_t shown = 0;        ///< the band that the figures and the picture are made of
+  PictureStyle style = {};
+};
+
+/// Fills one tile of the output.
+using TileWork = std::function<void(const Tile& tile, orvik::tessel::Raster& out)>;
+
+/// Does the work for all tiles, writes the GeoTIFF and the picture and prints a line of figures for the
+/// output on standard output. @throws Refusal if a tile of the output is larger than a raster can be
+void RunJob(const Job& job, const TileWork& work);
 
 /// Fills one output tile from one input tile.
 using TileOperation = std::function<void(LoadedTile& in, orvik::tessel::Raster& out)>;
 
-/// Runs an operation over all tiles of the input, writes the GeoTIFF and the picture and prints a line of
-/// figures for the output on standard output.
+/// The same for one input and one band, with texts of the picture that are made from the input.
 void RunJob(const JobOptions& options, GDALDataset& input, const TileReader& reader, const Quantity& quantity,
-            const PictureStyle& style, const TileOperation& operation);
+            PictureStyle style, const TileOperation& operation);
 
 }  // namespace examples

@@ -41,6 +41,14 @@ void CopyGeoreference(GDALDataset& from, GDALDataset& to) {
     to.SetMetadataItem(GDALMD_AREA_OR_POINT, kind);
 }
 
+void DescribeBand(GDALRasterBand& band, const Quantity& quantity) {
+  if (quantity.noData) SetNoData(band, *quantity.noData);
+  band.SetDescription(quantity.name.c_str());
+  band.SetUnitType(quantity.unit.c_str());
+  if (quantity.scale != 1.0) band.SetScale(quantity.scale);
+  if (quantity.flat) band.SetMetadataItem("FLAT_VALUE", CPLSPrintf("%.9g", *quantity.flat));
+}
+
 }  // namespace
 
 double DefaultNoData(GDALDataType type) {
@@ -72,28 +80,26 @@ void CheckStorable(const std::string& argument, double value, GDALDataType type)
 }
 
 OutputRaster::OutputRaster(const PendingFile& file, GDALDataset& source, GDALDataType type,
-                           const Quantity& quantity)
+                           const std::vector<Quantity>& bands)
     : name_(file.Target()), type_(type) {
   GDALDriver* driver = GetGDALDriverManager()->GetDriverByName("GTiff");
   const char* const options[] = {"BIGTIFF=IF_SAFER", nullptr};
   dataset_.reset(driver->Create(file.TemporaryPath().c_str(), source.GetRasterXSize(),
-                                source.GetRasterYSize(), 1, type, const_cast<char**>(options)));
+                                source.GetRasterYSize(), static_cast<int>(bands.size()), type,
+                                const_cast<char**>(options)));
   ThrowOnGdalError("creating '" + name_ + "'", dataset_ ? CE_None : CE_Failure);
   CopyGeoreference(source, *dataset_);
-  GDALRasterBand& band = *dataset_->GetRasterBand(1);
-  if (quantity.noData) SetNoData(band, *quantity.noData);
-  band.SetDescription(quantity.name.c_str());
-  band.SetUnitType(quantity.unit.c_str());
-  if (quantity.scale != 1.0) band.SetScale(quantity.scale);
-  if (quantity.flat) band.SetMetadataItem("FLAT_VALUE", CPLSPrintf("%.9g", *quantity.flat));
+  for (std::size_t i = 0; i < bands.size(); ++i)
+    DescribeBand(*dataset_->GetRasterBand(static_cast<int>(i) + 1), bands[i]);
   ThrowOnGdalError("writing '" + name_ + "'");
 }
 
 void OutputRaster::Write(const Tile& tile, const orvik::tessel::Raster& raster) {
   const auto width = static_cast<int>(tile.width), height = static_cast<int>(tile.height);
-  const CPLErr result =
-      dataset_->GetRasterBand(1)->RasterIO(GF_Write, static_cast<int>(tile.x), static_cast<int>(tile.y),
-                                           width, height, raster.data, width, height, type_, 0, 0, nullptr);
+  const GSpacing sample = GDALGetDataTypeSizeBytes(type_), pixel = sample * raster.channels;
+  const CPLErr result = dataset_->RasterIO(
+      GF_Write, static_cast<int>(tile.x), static_cast<int>(tile.y), width, height, raster.data, width, height,
+      type_, static_cast<int>(raster.channels), nullptr, pixel, pixel * width, sample, nullptr);
   ThrowOnGdalError("writing '" + name_ + "'", result);
 }
 

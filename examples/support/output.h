@@ -2,6 +2,7 @@
 
 #include <optional>
 #include <string>
+#include <vector>
 
 #include "basic/tessel/raster.h"
 #include "gdal.h"
@@ -21,14 +22,15 @@ bool IsStorable(double value, GDALDataType type);
 /// Refuses a value that is not storable.
 void CheckStorable(const std::string& argument, double value, GDALDataType type);
 
-/// A one-band GeoTIFF with the georeference of its source, written tile by tile.
+/// A GeoTIFF with the georeference of its source, written tile by tile.
 class OutputRaster {
  public:
-  OutputRaster(const PendingFile& file, GDALDataset& source, GDALDataType type, const Quantity& quantity);
+  OutputRaster(const PendingFile& file, GDALDataset& source, GDALDataType type,
+               const std::vector<Quantity>& bands);
 
   orvik::tessel::DataType Type() const { return TypeOf(type_); }
 
-  /// `raster` has no margins and one channel.
+  /// `raster` has no margins, and a channel for each band.
   void Write(const Tile& tile, const orvik::tessel::Raster& raster);
 
   /// Writes what is still in memory. @throws Failure if the disk is full

@@ -34,6 +34,13 @@ Colour HeatRamp(double position) {
   return Oklch(0.97 - 0.71 * position, chroma, 0.29 - 0.40 * position);
 }
 
+Colour ChangeRamp(double position) {
+  const double side = 2.0 * position - 1.0, distance = std::abs(side);
+  const double chroma = distance * (0.19 - 0.12 * distance);  // as far as sRGB has dark teals
+  const double lightness = 0.93 - 0.52 * distance;
+  return side < 0.0 ? Oklch(lightness, 1.3 * chroma, 0.15) : Oklch(lightness, chroma, 0.58);
+}
+
 Colour CompassRamp(double position) {
   const double light = std::cos(2.0 * std::numbers::pi * (position - 315.0 / 360.0));
   return Oklch(0.70 + 0.18 * light, 0.105, 0.58 - position);

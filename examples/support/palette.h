@@ -18,6 +18,11 @@ Colour GreyRamp(double position);
 /// From pale yellow over red to dark violet, evenly darker: for amounts.
 Colour HeatRamp(double position);
 
+/// From dark brown over light grey to dark teal, equally dark on both sides: for decrease and increase. The
+/// sides differ in blue, which the common forms of colour blindness leave, and the middle is no white that
+/// could be taken for paper.
+Colour ChangeRamp(double position);
+
 /// A closed circle of hues, lightest at the north-west, as maps light their relief: for directions, 0 and 1
 /// being north.
 Colour CompassRamp(double position);

@@ -29,8 +29,8 @@ constexpr Colour flatColour = {0.90, 0.90, 0.88};
 constexpr double full = 2.0 * std::numbers::pi;
 
 // Sizes in pixels of the picture.
-constexpr int border = 24, header = 76, footer = 56, legendWidth = 164, leastMap = 300, bestMap = 900,
-              greatestMap = 1600;
+constexpr int border = 24, header = 76, footer = 56, legendWidth = 164, leastMap = 300, leastHeight = 360,
+              bestMap = 900, greatestMap = 1600, barHeight = 240;
 
 // The values as they are shown: reduced if the raster is large, north up if its rows run northwards.
 struct Shown {
@@ -42,8 +42,7 @@ struct Shown {
   std::vector<unsigned char> valid;
 };
 
-Shown ReadShown(GDALDataset& dataset, const Quantity& quantity) {
-  GDALRasterBand& band = *dataset.GetRasterBand(1);
+Shown ReadShown(GDALRasterBand& band, const Quantity& quantity) {
   const int width = band.GetXSize(), height = band.GetYSize(), longer = std::max(width, height);
   const double reduction = std::max(1.0, static_cast<double>(longer) / greatestMap);
   const auto reduced = [&](int size) { return std::max(1, static_cast<int>(std::lround(size / reduction))); };
@@ -62,39 +61,11 @@ Shown ReadShown(GDALDataset& dataset, const Quantity& quantity) {
   return shown;
 }
 
-// What the ramp spans, rounded outwards to steps that read well.
-struct Scale {
-  double low = 0.0;
-  double high = 1.0;
-  double step = 1.0;
-  bool more = false;  // there are values above `high`
-  bool less = false;
-
-  double Position(double value) const { return std::clamp((value - low) / (high - low), 0.0, 1.0); }
-};
-
-double NiceStep(double roughly) {
-  const double power = std::pow(10.0, std::floor(std::log10(roughly)));
-  for (const double factor : {1.0, 2.0, 5.0})
-    if (roughly <= factor * power) return factor * power;
-  return 10.0 * power;
-}
-
-Scale ScaleFor(const Shown& shown, bool fromZero) {
+Scale ScaleFor(const Shown& shown, Span span) {
   std::vector<double> values;
   for (std::size_t i = 0; i < shown.values.size(); ++i)
     if (shown.valid[i] && std::isfinite(shown.values[i])) values.push_back(shown.values[i]);
-  if (values.empty()) return {};
-  std::sort(values.begin(), values.end());
-  const std::size_t tail = values.size() / 200;
-  const double low = fromZero ? 0.0 : values[tail], high = values[values.size() - 1 - tail];
-  if (high <= low) return {low, low + 1.0};
-  Scale scale{.step = NiceStep((high - low) / 6.0)};
-  scale.low = std::floor(low / scale.step) * scale.step;
-  scale.high = std::ceil(high / scale.step) * scale.step;
-  scale.less = values.front() < scale.low;
-  scale.more = values.back() > scale.high;
-  return scale;
+  return Scale(std::move(values), span);
 }
 
 void SetColour(cairo_t* canvas, const Colour& colour) {
@@ -161,7 +132,7 @@ void DrawMap(cairo_t* canvas, const Surface& map, const Shown& shown, const Cell
 }
 
 void DrawBar(cairo_t* canvas, double x, double y, const Scale& scale, Ramp ramp) {
-  constexpr int width = 22, height = 240;
+  constexpr int width = 22, height = barHeight;
   for (int row = 0; row < height; ++row) {
     SetColour(canvas, ramp(1.0 - (row + 0.5) / height));
     cairo_rectangle(canvas, x, y + row, width, 1.0);
@@ -170,16 +141,13 @@ void DrawBar(cairo_t* canvas, double x, double y, const Scale& scale, Ramp ramp)
   SetColour(canvas, softInk);
   cairo_rectangle(canvas, x - 0.5, y - 0.5, width + 1.0, height + 1.0);
   cairo_stroke(canvas);
-  const auto ticks = static_cast<int>(std::lround((scale.high - scale.low) / scale.step));
-  for (int tick = 0; tick <= ticks; ++tick) {
-    const double at = std::round(y + height - height * static_cast<double>(tick) / ticks) - 0.5;
+  for (const Scale::Tick& tick : scale.Ticks()) {
+    const double at = std::round(y + height - height * tick.position) - 0.5;
     cairo_move_to(canvas, x + width, at);
     cairo_line_to(canvas, x + width + 5.0, at);
     SetColour(canvas, softInk);
     cairo_stroke(canvas);
-    const char* bound = tick == 0 && scale.less ? "≤ " : tick == ticks && scale.more ? "≥ " : "";
-    DrawText(canvas, x + width + 10.0, at + 5.0, CPLSPrintf("%s%.6g", bound, scale.low + tick * scale.step),
-             14, ink);
+    DrawText(canvas, x + width + 10.0, at + 5.0, tick.label, 14, ink);
   }
 }
 
@@ -213,14 +181,46 @@ void DrawRose(cairo_t* canvas, double x, double y, const Quantity& quantity, Ram
   DrawText(canvas, x + 32.0, centreY + outer + 51.0, CPLSPrintf("flat (%g)", *quantity.flat), 14, ink);
 }
 
-void DrawLegend(cairo_t* canvas, double x, const Quantity& quantity, const Scale& scale, Ramp ramp) {
-  DrawText(canvas, x, header + 14.0, quantity.name, 15, ink, CAIRO_FONT_WEIGHT_BOLD);
-  DrawText(canvas, x, header + 33.0, quantity.unit, 13, softInk);
-  if (quantity.compass) {
-    DrawRose(canvas, x, header + 48.0, quantity, ramp);
-  } else {
-    DrawBar(canvas, x, header + 52.0, scale, ramp);
+// A square that shows what stands behind the picture, as the map does where it has no data.
+void DrawNoDataKey(cairo_t* canvas, double x, double y) {
+  cairo_rectangle(canvas, x, y, 22.0, 22.0);
+  cairo_set_operator(canvas, CAIRO_OPERATOR_CLEAR);
+  cairo_fill(canvas);
+  cairo_set_operator(canvas, CAIRO_OPERATOR_OVER);
+  cairo_rectangle(canvas, x - 0.5, y - 0.5, 23.0, 23.0);
+  SetColour(canvas, softInk);
+  cairo_stroke(canvas);
+  DrawText(canvas, x + 32.0, y + 16.0, "no data", 14, ink);
+}
+
+// The name and up to two lines of explanation; returns the height that they end at.
+double DrawLegendHead(cairo_t* canvas, double x, const Quantity& quantity, const PictureStyle& style) {
+  double y = header + 14.0;
+  DrawText(canvas, x, y, style.legend.empty() ? quantity.name : style.legend, 15, ink,
+           CAIRO_FONT_WEIGHT_BOLD);
+  for (const std::string& line : {style.note, style.unit.empty() ? quantity.unit : style.unit}) {
+    if (line.empty()) continue;
+    y += 19.0;
+    DrawText(canvas, x, y, line, 13, softInk);
   }
+  return std::max(y, header + 33.0);
+}
+
+// The ramp stands between the words for its ends if it has some.
+void DrawLegend(cairo_t* canvas, double x, const Shown& shown, const Quantity& quantity, const Scale& scale,
+                const PictureStyle& style) {
+  double y = DrawLegendHead(canvas, x, quantity, style);
+  if (quantity.compass) {
+    DrawRose(canvas, x, y + 15.0, quantity, style.ramp);
+    return;
+  }
+  if (!style.top.empty()) DrawText(canvas, x, y += 27.0, style.top, 13, ink);
+  y += style.top.empty() ? 19.0 : 12.0;
+  DrawBar(canvas, x, y, scale, style.ramp);
+  y += barHeight;
+  if (!style.bottom.empty()) DrawText(canvas, x, y += 21.0, style.bottom, 13, ink);
+  if (std::find(shown.valid.begin(), shown.valid.end(), 0) != shown.valid.end())
+    DrawNoDataKey(canvas, x, y + 20.0);
 }
 
 // A bar of a round length, at most a third of the map.
@@ -240,22 +240,22 @@ void DrawScaleBar(cairo_t* canvas, const Shown& shown, const Cell& cell) {
 
 }  // namespace
 
-void DrawPicture(GDALDataset& dataset, const Quantity& quantity, const PictureStyle& style,
+void DrawPicture(GDALDataset& dataset, int band, const Quantity& quantity, const PictureStyle& style,
                  const std::string& png) {
-  const Shown shown = ReadShown(dataset, quantity);
+  const Shown shown = ReadShown(*dataset.GetRasterBand(band), quantity);
   const Cell cell = CellOf(dataset);
-  const Scale scale = quantity.compass ? Scale{} : ScaleFor(shown, style.fromZero);
+  const Scale scale = ScaleFor(shown, style.span);
   const int mapWidth = shown.width * shown.factor, mapHeight = shown.height * shown.factor;
   const int width = border + std::max(mapWidth, leastMap) + border + legendWidth;
   Surface paper(cairo_image_surface_create(CAIRO_FORMAT_ARGB32, width,
-                                           header + std::max(mapHeight, leastMap) + footer));
+                                           header + std::max(mapHeight, leastHeight) + footer));
   Canvas canvas(cairo_create(paper.get()));
   cairo_set_source_rgb(canvas.get(), 1.0, 1.0, 1.0);
   cairo_paint(canvas.get());
   DrawText(canvas.get(), border, 36.0, style.title, 22, ink, CAIRO_FONT_WEIGHT_BOLD);
   DrawText(canvas.get(), border, 60.0, style.caption, 13, softInk);
   DrawMap(canvas.get(), PaintMap(shown, quantity, scale, style.ramp), shown, cell);
-  DrawLegend(canvas.get(), border + std::max(mapWidth, leastMap) + border, quantity, scale, style.ramp);
+  DrawLegend(canvas.get(), border + std::max(mapWidth, leastMap) + border, shown, quantity, scale, style);
   DrawScaleBar(canvas.get(), shown, cell);
   const cairo_status_t status = cairo_surface_write_to_png(paper.get(), png.c_str());
   if (status != CAIRO_STATUS_SUCCESS)

@@ -5,23 +5,28 @@
 #include "gdal.h"
 #include "palette.h"
 #include "quantity.h"
+#include "scale.h"
 
 namespace examples {
 
 /// How a raster is shown.
 struct PictureStyle {
   Ramp ramp = GreyRamp;
-  bool fromZero = false;  ///< the ramp begins at 0, not at the least values of the raster
+  Span span = Span::values;
   std::string title = {};
   std::string caption = {};
+  std::string legend = {};  ///< heads the legend; empty: the name of the quantity
+  std::string note = {};    ///< stands below it
+  std::string unit = {};    ///< stands below that; empty: the unit of the quantity
+  std::string top = {};     ///< what the upper end of the ramp means
+  std::string bottom = {};  ///< what the lower end means
 };
 
-/// Draws a one-band raster as a PNG file with a title, a legend and, where the coordinates are lengths, a
-/// scale bar.
+/// Draws a band as a PNG file with a title, a legend and, where the coordinates are lengths, a scale bar.
 ///
-/// Small rasters are enlarged by a whole factor, large ones reduced. No-data is transparent. The ramp leaves
-/// out the lowest and the highest half percent of the values; directions get a compass rose as their legend.
-void DrawPicture(GDALDataset& dataset, const Quantity& quantity, const PictureStyle& style,
+/// Small rasters are enlarged by a whole factor, large ones reduced. No-data is transparent. Directions get a
+/// compass rose as their legend.
+void DrawPicture(GDALDataset& dataset, int band, const Quantity& quantity, const PictureStyle& style,
                  const std::string& png);
 
 }  // namespace examples

@@ -28,8 +28,7 @@ struct Sums {
 
 }  // namespace
 
-Summary Summarise(GDALDataset& dataset, const Quantity& quantity) {
-  GDALRasterBand& band = *dataset.GetRasterBand(1);
+Summary Summarise(GDALRasterBand& band, const Quantity& quantity) {
   const int width = band.GetXSize();
   std::vector<double> values(static_cast<std::size_t>(width));
   std::vector<unsigned char> valid(values.size());

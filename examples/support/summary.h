@@ -8,7 +8,7 @@
 
 namespace examples {
 
-/// The figures of a one-band raster, in the unit of its quantity.
+/// The figures of a band, in the unit of its quantity.
 struct Summary {
   std::uint64_t pixels = 0;
   std::uint64_t valid = 0;
@@ -18,7 +18,7 @@ struct Summary {
   double max = 0.0;
 };
 
-Summary Summarise(GDALDataset& dataset, const Quantity& quantity);
+Summary Summarise(GDALRasterBand& band, const Quantity& quantity);
 
 /// "min 0.0, mean 2.1, max 11.3 degrees, 12321 of 12321 pixels valid"
 std::string Describe(const Summary& summary, const Quantity& quantity);

@@ -71,31 +71,38 @@ std::vector<Tile> CutTiles(std::uint32_t width, std::uint32_t height, std::uint3
   return tiles;
 }
 
-TileReader::TileReader(GDALDataset& dataset, std::vector<int> bands, std::uint32_t margin, std::uint32_t side)
-    : dataset_(dataset), bands_(std::move(bands)), margin_(margin) {
-  bool signedBytes = true;
-  for (const int number : bands_) {
-    GDALRasterBand& band = *dataset_.GetRasterBand(number);
-    type_ =
-        type_ == GDT_Unknown ? band.GetRasterDataType() : GDALDataTypeUnion(type_, band.GetRasterDataType());
+TileReader::TileReader(BandSource source, std::uint32_t margin, std::uint32_t side)
+    : source_(std::move(source)), margin_(margin) {
+  GDALDataType held = GDT_Unknown;
+  std::size_t signedBytes = 0;
+  for (const int number : source_.bands) {
+    GDALRasterBand& band = *source_.dataset.GetRasterBand(number);
+    const GDALDataType type = band.GetRasterDataType();
+    held = held == GDT_Unknown ? type : GDALDataTypeUnion(held, type);
     masked_ = masked_ || band.GetMaskFlags() != GMF_ALL_VALID;
-    signedBytes = signedBytes && IsSignedByte(band);
+    signedBytes += IsSignedByte(band) ? 1u : 0u;
   }
-  dataType_ = signedBytes ? DataType::Of<char>() : TypeOf(type_);
+  if (source_.type == GDT_Unknown) source_.type = held;
+  const bool allSigned = signedBytes == source_.bands.size() && source_.type == GDT_Byte;
+  if (signedBytes > 0 && !allSigned)
+    throw Refusal(source_.argument, "has signed bytes, which are not read as another type",
+                  "a raster of another pixel type");
+  dataType_ = allSigned ? DataType::Of<char>() : TypeOf(source_.type, source_.argument);
   masked_ = masked_ || dataType_.isFloat;
 
   const auto extent = [&](int size) {
     return std::min<std::uint64_t>(static_cast<std::uint64_t>(size), side) + 2 * margin_;
   };
-  const std::uint64_t pixels = extent(dataset_.GetRasterXSize()) * extent(dataset_.GetRasterYSize());
-  if (pixels * PixelBytes(dataType_, bands_.size()) > INT32_MAX)
+  const std::uint64_t pixels =
+      extent(source_.dataset.GetRasterXSize()) * extent(source_.dataset.GetRasterYSize());
+  if (pixels * PixelBytes(dataType_, source_.bands.size()) > INT32_MAX)
     throw Refusal("--tile", "a tile of side " + std::to_string(side) + " takes more than 2 GiB",
                   "a smaller one");
 }
 
 TileReader::Window TileReader::InsideOf(const Tile& tile) const {
-  const auto imageWidth = static_cast<std::uint32_t>(dataset_.GetRasterXSize());
-  const auto imageHeight = static_cast<std::uint32_t>(dataset_.GetRasterYSize());
+  const auto imageWidth = static_cast<std::uint32_t>(source_.dataset.GetRasterXSize());
+  const auto imageHeight = static_cast<std::uint32_t>(source_.dataset.GetRasterYSize());
   const std::uint32_t left = std::min(tile.x, margin_), above = std::min(tile.y, margin_);
   const std::uint32_t right = std::min(imageWidth - tile.x - tile.width, margin_);
   const std::uint32_t below = std::min(imageHeight - tile.y - tile.height, margin_);
@@ -104,7 +111,7 @@ TileReader::Window TileReader::InsideOf(const Tile& tile) const {
 }
 
 LoadedTile TileReader::Read(const Tile& tile) const {
-  const RasterInfo info(tile.width, tile.height, static_cast<std::uint32_t>(bands_.size()), dataType_);
+  const RasterInfo info(tile.width, tile.height, static_cast<std::uint32_t>(source_.bands.size()), dataType_);
   const RasterContext context(margin_, margin_, tile.x, tile.y);
   LoadedTile loaded{std::make_unique<Raster>(info, context), nullptr};
   const Window inside = InsideOf(tile);
@@ -125,13 +132,13 @@ LoadedTile TileReader::Read(const Tile& tile) const {
 void TileReader::ReadSamples(const Window& inside, Raster& raster) const {
   const auto pixelBytes = static_cast<GSpacing>(PixelBytes(dataType_, raster.channels));
   const auto width = static_cast<int>(inside.width), height = static_cast<int>(inside.height);
-  std::vector<int> bands = bands_;
-  const CPLErr result = dataset_.RasterIO(
+  std::vector<int> bands = source_.bands;
+  const CPLErr result = source_.dataset.RasterIO(
       GF_Read, static_cast<int>(inside.x), static_cast<int>(inside.y), width, height,
-      raster.data + inside.Offset() * static_cast<std::size_t>(pixelBytes), width, height, type_,
+      raster.data + inside.Offset() * static_cast<std::size_t>(pixelBytes), width, height, source_.type,
       static_cast<int>(bands.size()), bands.data(), pixelBytes, pixelBytes * inside.bufferWidth,
       pixelBytes / static_cast<GSpacing>(raster.channels), nullptr);
-  ThrowOnGdalError("reading INPUT", result);
+  ThrowOnGdalError("reading " + source_.argument, result);
   inside.RepeatEdges(raster.data, static_cast<std::size_t>(pixelBytes));
 }
 
@@ -139,13 +146,13 @@ std::vector<unsigned char> TileReader::ReadValidity(const Window& inside, const 
   const std::size_t pixels = static_cast<std::size_t>(inside.bufferWidth) * inside.bufferHeight;
   std::vector<unsigned char> valid(pixels, 1), ofBand(pixels, 1);
   const auto width = static_cast<int>(inside.width), height = static_cast<int>(inside.height);
-  for (const int number : bands_) {
-    GDALRasterBand& band = *dataset_.GetRasterBand(number);
+  for (const int number : source_.bands) {
+    GDALRasterBand& band = *source_.dataset.GetRasterBand(number);
     if (band.GetMaskFlags() == GMF_ALL_VALID) continue;
     const CPLErr result = band.GetMaskBand()->RasterIO(
         GF_Read, static_cast<int>(inside.x), static_cast<int>(inside.y), width, height,
         ofBand.data() + inside.Offset(), width, height, GDT_Byte, 1, inside.bufferWidth, nullptr);
-    ThrowOnGdalError("reading the mask of INPUT", result);
+    ThrowOnGdalError("reading the mask of " + source_.argument, result);
     inside.RepeatEdges(ofBand.data(), 1);
     for (std::size_t i = 0; i < pixels; ++i) valid[i] = valid[i] != 0 && ofBand[i] != 0;
   }

@@ -28,16 +28,27 @@ struct LoadedTile {
   std::unique_ptr<orvik::tessel::Mask> mask;
 };
 
-/// Reads tiles of some bands in their own type, with a margin of neighbouring pixels around them.
+/// Which samples of a raster are read.
+struct BandSource {
+  GDALDataset& dataset;
+  std::vector<int> bands;           ///< count from 1
+  std::string argument = "INPUT";   ///< names the raster in messages
+  GDALDataType type = GDT_Unknown;  ///< to read in; unknown: the type that holds all the bands
+};
+
+/// Reads tiles of some bands, in their own type unless told otherwise, with a margin of neighbouring pixels
+/// around them.
 ///
 /// The margin holds the pixels of the neighbouring tiles; beyond the image it repeats the nearest edge pixel,
 /// validity included. A pixel is invalid where GDAL's mask of one of the bands says so, which covers no-data
 /// values, alpha and mask bands, or where a floating sample is NaN.
 class TileReader {
  public:
-  /// Bands count from 1. Bands of unlike types are read in the type that holds them all.
-  /// @throws Refusal if a tile of `side` x `side` pixels is larger than a raster can be
-  TileReader(GDALDataset& dataset, std::vector<int> bands, std::uint32_t margin, std::uint32_t side);
+  /// @throws Refusal if a tile of `side` x `side` pixels is larger than a raster can be, or if signed bytes
+  /// would have to be widened, as GDAL before 3.7 reads them unsigned
+  TileReader(BandSource source, std::uint32_t margin, std::uint32_t side);
+
+  orvik::tessel::DataType Type() const { return dataType_; }
 
   /// True if a pixel may be invalid.
   bool Masked() const { return masked_; }
@@ -50,10 +61,8 @@ class TileReader {
   void ReadSamples(const Window& inside, orvik::tessel::Raster& raster) const;
   std::vector<unsigned char> ReadValidity(const Window& inside, const orvik::tessel::Raster& raster) const;
 
-  GDALDataset& dataset_;
-  std::vector<int> bands_;
+  BandSource source_;
   std::uint32_t margin_;
-  GDALDataType type_ = GDT_Unknown;
   orvik::tessel::DataType dataType_;
   bool masked_ = false;
 };
