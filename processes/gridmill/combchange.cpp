@@ -136,7 +136,7 @@ class CombChange::InnerProcessor : public IChange, public details::CombParams {
 
  private:
   static frame::BlockShape ShapeOf(std::size_t m, std::size_t n) {
-    frame::BlockShape shape = frame::SampleBlocks(m + n);
+    frame::BlockShape shape = frame::SampleBlocks(m + n, 8192);
     shape.imageSamples = m;
     shape.referenceSamples = n;
     return shape;
@@ -156,7 +156,7 @@ class CombChange::InnerProcessor : public IChange, public details::CombParams {
   }
 
   /// Deliberate: beside an image that does not order below it, a reference of another type is read byte by
-  /// byte if it has 8 bits, and counts as 0 if it has more.
+  /// byte if it has 8 bits, and counts as 0 if it has another width.
   void CombineBytes(const frame::TwoDates& dates) const {
     const std::size_t m = dates.image.channels, n = dates.reference.channels;
     const bool read = dates.reference.dataType.sizeBits == 8;

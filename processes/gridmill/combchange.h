@@ -35,10 +35,10 @@ class GRIDMILL_EXPORT CombParams : public ChangeParams<DiffType> {};
 /// two objects are independent.
 ///
 /// Deliberate: beside an image that does not order below it, a reference of another type is read byte by byte
-/// as `unsigned char` if it has 8 bits, and comes out as 0 if it has more. Deliberate: an image that orders
-/// below its reference is read as decimal text: the two bytes of a 16-bit sample through `atoi`, so that
-/// 0x3231 gives 12 and most samples give 0; other widths give 0. The reference is then read in elements of
-/// the image's type.
+/// as `unsigned char` if it has 8 bits, and comes out as 0 if it has another width. Deliberate: an image that
+/// orders below its reference is read as decimal text: the two bytes of a 16-bit sample through `atoi`, so
+/// that 0x3231 gives 12 and most samples give 0; other widths give 0. The reference is then read in elements
+/// of the image's type.
 ///
 /// Example: image pixel (1, 2, 3), reference pixel (4, 5): (1, 2, 3, 4, 5).
 /// Source: the composite of dates on which multidate classification works, Singh (1989), "Digital change

@@ -27,8 +27,9 @@ constexpr std::uint32_t kLargePixels[] = {33000, 33000, 90000};
 constexpr int kCasesOfAWidth = 4;
 
 constexpr int kTypes[] = {0, 1, 2, 0, 1, 2, -1, 3, 7};
-constexpr float kNoData[] = {0.0f,  0.0f,  -0.0f, 3.4e38f, -9999.0f, -1.0f,  2.5f,      -2.5f,      127.5f,
-                             255.f, 300.f, 3e9f,  1e20f,   -1e20f,   1e-40f, kInfinity, -kInfinity, kNaN};
+constexpr float kNoData[] = {8388609.0f, 0.0f,   0.0f,      -0.0f,      3.4e38f, -9999.0f, -1.0f,
+                             2.5f,       -2.5f,  127.5f,    255.f,      300.f,   3e9f,     1e20f,
+                             -1e20f,     1e-40f, kInfinity, -kInfinity, kNaN};
 constexpr float kMatched[] = {0.0f,  0.0f,        1.0f,      1.0f,       2.0f,    3.0f,    3.0f,     7.0f,
                               -0.0f, -1.0f,       255.0f,    -128.0f,    300.0f,  32767.f, 65535.0f, 2.5f,
                               0.1f,  16777216.0f, 0x1p31f,   0x1p32f,    0x1p53f, 0x1p62f, 0x1p63f,  0x1p64f,

@@ -1,5 +1,6 @@
 #include "tests/support/compare.h"
 
+#include <algorithm>
 #include <cmath>
 #include <cstdint>
 #include <cstring>
@@ -29,10 +30,11 @@ void Print(std::ostream& stream, T value) {
 
 template <class T>
 std::string Describe(const tessel::Raster& raster, std::uint64_t element, T expected, T actual) {
-  const std::uint64_t elements = raster.channels * (raster.dataType.isComplex ? 2u : 1u);
+  const std::uint64_t elements = std::max(1u, raster.channels * (raster.dataType.isComplex ? 2u : 1u));
+  const std::uint64_t width = std::max(1u, raster.bufferWidth);
   const std::uint64_t pixel = element / elements;
-  const auto x = static_cast<std::int64_t>(pixel % raster.bufferWidth) - raster.marginX;
-  const auto y = static_cast<std::int64_t>(pixel / raster.bufferWidth) - raster.marginY;
+  const auto x = static_cast<std::int64_t>(pixel % width) - raster.marginX;
+  const auto y = static_cast<std::int64_t>(pixel / width) - raster.marginY;
   std::ostringstream stream;
   stream << NameOf(raster.dataType) << " of " << raster.width << " x " << raster.height << " x "
          << raster.channels << ", margins " << raster.marginX << ", " << raster.marginY << ": pixel (" << x

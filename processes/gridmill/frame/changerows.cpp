@@ -91,6 +91,15 @@ class PixelWriter {
         streams_(pixelBytes_ == bytes_ && raster.dataSize > kStreamedBytes) {
     if (!InPlace()) block_.resize(shape.pixels * bytes_);
   }
+  PixelWriter(const PixelWriter&) = delete;
+  PixelWriter& operator=(const PixelWriter&) = delete;
+
+  /// Other threads see streamed bytes only after the fence.
+  ~PixelWriter() {
+#ifdef __SSE2__
+    if (streams_) _mm_sfence();
+#endif
+  }
 
   /// Where the samples of the pixels from (x, y) on are to be put.
   unsigned char* At(std::uint32_t x, std::uint32_t y) {
@@ -105,13 +114,6 @@ class PixelWriter {
     if (streams_) return StreamBytes(block_.data(), pixels * bytes_, row);
     for (std::size_t i = 0; i < pixels; ++i)
       std::memcpy(row + i * pixelBytes_, block_.data() + i * bytes_, bytes_);
-  }
-
-  /// Called when all are written: other threads see streamed bytes only after it.
-  void Finish() const {
-#ifdef __SSE2__
-    if (streams_) _mm_sfence();
-#endif
   }
 
  private:
@@ -163,7 +165,6 @@ void WalkBlocks(const TwoDates& dates, const BlockShape& shape, const ElementTyp
       out.Write(x, y, pixels);
     }
   });
-  out.Finish();
 }
 
 }  // namespace orvik::frame

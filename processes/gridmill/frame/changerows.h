@@ -22,7 +22,7 @@ struct TwoDates {
 };
 
 /// Pixels of a block at most, and of one whose pixels are single results.
-inline constexpr std::size_t kMaxBlock = 4096;
+inline constexpr std::size_t kMaxBlock = 2048;
 inline constexpr std::size_t kPixelBlock = 256;
 
 /// How an operator takes its pixels.
@@ -34,10 +34,11 @@ struct BlockShape {
   bool dense;              ///< the samples of a block follow each other without others between
 };
 
-/// For operators that treat each sample by itself: the same number of samples in all three rasters, and
-/// blocks of few thousand samples, in whole vectors where pixels are not large.
-inline BlockShape SampleBlocks(std::size_t channels) {
-  const std::size_t pixels = kMaxBlock / std::max<std::size_t>(channels, 1);
+/// For operators that treat each sample by itself: the same number of samples in all three rasters.
+///
+/// @param samples  of a block at most, in whole vectors where pixels are not large
+inline BlockShape SampleBlocks(std::size_t channels, std::size_t samples = 2048) {
+  const std::size_t pixels = std::min(kMaxBlock, samples / std::max<std::size_t>(channels, 1));
   return {pixels >= 64 ? pixels & ~std::size_t{63} : std::max<std::size_t>(pixels, 1), channels, channels,
           channels, true};
 }
@@ -73,7 +74,8 @@ struct ElementTypes {
 
 /// Calls `row(block)` for all pixels of the image in their order, on the caller's thread. Samples are used
 /// where they stand, or gathered where a raster holds another type than it is to be read as or, for a dense
-/// block, more or fewer samples; likewise for the output.
+/// block, more or fewer samples; likewise for the output. A large output goes past the caches, by way of a
+/// scratch block.
 void WalkBlocks(const TwoDates& dates, const BlockShape& shape, const ElementTypes& types,
                 const std::function<void(const RawBlock&)>& row);
 

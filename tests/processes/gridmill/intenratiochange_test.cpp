@@ -111,6 +111,40 @@ TEST(IntenRatioChange, OneChannelImageBesideAThreeChannelReferenceAreAveragedOve
   EXPECT_EQ((Ratio<short, short>(ratio, {1, 2, 9}, {40})), (std::vector<short>{4, 40, -10, 0}));
 }
 
+/// Compares the means of all sums of `channels` samples with the divisions that the operator does without.
+template <class In, std::uint32_t channels>
+void ExpectQuotientsOfAllSums() {
+  const int largest = std::numeric_limits<In>::max();
+  const int lowest = std::numeric_limits<In>::min();
+  const auto least = static_cast<int>(channels) * lowest, most = static_cast<int>(channels) * largest;
+  std::vector<int> sums;
+  for (int sum = least; sum <= most; ++sum) sums.push_back(sum);
+  Image<In> image({static_cast<std::uint32_t>(sums.size()), 1, channels});
+  for (std::size_t x = 0; x < sums.size(); ++x) {
+    int rest = sums[x];
+    for (std::uint32_t c = 0; c < channels; ++c) {
+      const int left = static_cast<int>(channels - c);
+      const int share = std::clamp(rest - (left - 1) * (x % 2 == 0 ? lowest : largest), lowest, largest);
+      image.At(static_cast<int>(x), 0, c) = static_cast<In>(share);
+      rest -= share;
+    }
+    ASSERT_EQ(rest, 0);
+  }
+  Image<double> out({image.width, 1, 4});
+  IntenRatioChange(eDIFF_FORWARD).Process(&image, &image, nullptr, &out);
+  for (std::size_t x = 0; x < sums.size(); ++x)
+    ASSERT_EQ(out.At(static_cast<int>(x), 0), static_cast<double>(sums[x]) / channels) << sums[x];
+}
+
+TEST(IntenRatioChange, MeansOfNarrowSamplesAreTheRoundedQuotients) {
+  ExpectQuotientsOfAllSums<unsigned char, 3>();
+  ExpectQuotientsOfAllSums<unsigned char, 4>();
+  ExpectQuotientsOfAllSums<char, 3>();
+  ExpectQuotientsOfAllSums<unsigned short, 3>();
+  ExpectQuotientsOfAllSums<unsigned short, 4>();
+  ExpectQuotientsOfAllSums<short, 3>();
+}
+
 TEST(IntenRatioChange, OneNoDataChannelOutOfThreeGivesNoDataInAllFourChannels) {
   const IntenRatioChange ratio = WithNoDataOfZero(3);
   const std::vector<short> excluded(4, -5);
