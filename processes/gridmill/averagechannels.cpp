@@ -118,7 +118,9 @@ class AverageChannels::InnerProcessor : public IClipperProcessor, public details
     const std::size_t channels = in->channels;
     const float value = noData;
     // Deliberate: a masked pixel holds the bare casts of `noData`, neither rounded nor clamped.
-    const Out masked = tessel::PlainCast<Out>(tessel::PlainCast<In>(value));
+    // The first cast is volatile, as g++ takes the two for one that keeps the sign of a negative zero.
+    const volatile In cast = tessel::PlainCast<In>(value);
+    const Out masked = tessel::PlainCast<Out>(In{cast});
 
     frame::ParallelRows(in->height, std::uint64_t{in->width} * channels, [=](std::uint32_t y) {
       const In* const source = tessel::PixelAt<In>(*in, 0, y);

@@ -50,8 +50,8 @@ const Out* SpellRow(const In* source, std::size_t count, Out* target) {
 /// Copies pixels in chunks of a fixed size, which is faster than one of their own: what a chunk writes beyond
 /// a pixel, the next one replaces. Returns how many pixels it copied; those at the end have no room for that.
 template <std::size_t chunk>
-std::size_t CombineChunks(const unsigned char* a, std::size_t aBytes, const unsigned char* b,
-                          std::size_t bBytes, std::size_t pixels, unsigned char* target) {
+std::size_t JoinChunks(const unsigned char* a, std::size_t aBytes, const unsigned char* b, std::size_t bBytes,
+                       std::size_t pixels, unsigned char* target) {
   const std::size_t shorter = std::min(aBytes, bBytes);
   const std::size_t kept = shorter == 0 ? pixels : std::min(pixels, chunk / shorter + 1);
   for (std::size_t i = 0; i + kept < pixels; ++i) {
@@ -63,18 +63,18 @@ std::size_t CombineChunks(const unsigned char* a, std::size_t aBytes, const unsi
 }
 
 /// Copies `pixels` pixels of `aBytes` and `bBytes` bytes into one row, each pixel of `a` before that of `b`.
-void CombineBytes(const unsigned char* a, std::size_t aBytes, const unsigned char* b, std::size_t bBytes,
-                  std::size_t pixels, unsigned char* target) {
+void JoinPixels(const unsigned char* a, std::size_t aBytes, const unsigned char* b, std::size_t bBytes,
+                std::size_t pixels, unsigned char* target) {
   const std::size_t longer = std::max(aBytes, bBytes);
   std::size_t done = 0;
   if (longer <= 4) {
-    done = CombineChunks<4>(a, aBytes, b, bBytes, pixels, target);
+    done = JoinChunks<4>(a, aBytes, b, bBytes, pixels, target);
   } else if (longer <= 8) {
-    done = CombineChunks<8>(a, aBytes, b, bBytes, pixels, target);
+    done = JoinChunks<8>(a, aBytes, b, bBytes, pixels, target);
   } else if (longer <= 16) {
-    done = CombineChunks<16>(a, aBytes, b, bBytes, pixels, target);
+    done = JoinChunks<16>(a, aBytes, b, bBytes, pixels, target);
   } else if (longer <= 32) {
-    done = CombineChunks<32>(a, aBytes, b, bBytes, pixels, target);
+    done = JoinChunks<32>(a, aBytes, b, bBytes, pixels, target);
   }
   for (std::size_t i = done; i < pixels; ++i) {
     std::copy_n(a + i * aBytes, aBytes, target + i * (aBytes + bBytes));
@@ -101,9 +101,9 @@ class Combination {
   /// Writes a block.
   template <class Block>
   void Write(const Block& block, const Out* image, const Out* reference) {
-    CombineBytes(reinterpret_cast<const unsigned char*>(image), m_ * sizeof(Out),
-                 reinterpret_cast<const unsigned char*>(reference), n_ * sizeof(Out), block.pixels,
-                 reinterpret_cast<unsigned char*>(block.target));
+    JoinPixels(reinterpret_cast<const unsigned char*>(image), m_ * sizeof(Out),
+               reinterpret_cast<const unsigned char*>(reference), n_ * sizeof(Out), block.pixels,
+               reinterpret_cast<unsigned char*>(block.target));
     if (!block.masked) return;
     kernels::ReplicateRow(block.valid, m_ + n_, block.pixels, keep_.data());
     kernels::ReplaceMasked(keep_.data(), excluded_, block.pixels * (m_ + n_), block.target);

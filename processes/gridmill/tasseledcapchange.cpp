@@ -11,6 +11,7 @@
 #include "processes/gridmill/frame/frame.h"
 #include "processes/gridmill/kernels/changenodata.h"
 #include "processes/gridmill/kernels/multiversion.h"
+#include "processes/gridmill/kernels/pixelload.h"
 #include "processes/gridmill/kernels/rowconversions.h"
 
 namespace orvik::changedetection {
@@ -65,8 +66,7 @@ struct Brightness {
 /// Null if the axis has no weights for a sensor of this name.
 template <class Axis>
 const Sensor* FindSensor(const std::string& name) {
-  const auto found = std::find_if(std::begin(Axis::kSensors), std::end(Axis::kSensors),
-                                  [&](const Sensor& sensor) { return name == sensor.name; });
+  const Sensor* const found = std::ranges::find(Axis::kSensors, name, &Sensor::name);
   return found != std::end(Axis::kSensors) ? found : nullptr;
 }
 
@@ -90,14 +90,12 @@ GRIDMILL_INLINE double ProjectionOf(const double (&c)[kMaxBands], const double (
 
 // ---- row
 
-using Bands = double[kMaxBands][kBlock];
-
-template <Order order, std::size_t bands>
-GRIDMILL_MULTIVERSION void ProjectBands(const Bands& planes, const double (&weights)[kMaxBands],
-                                        std::size_t count, double* __restrict projection) {
+template <Order order, std::size_t bands, class In>
+GRIDMILL_MULTIVERSION void ProjectPixels(const In* __restrict pixels, const double (&weights)[kMaxBands],
+                                         std::size_t count, double* __restrict projection) {
   for (std::size_t i = 0; i < count; ++i) {
     double c[kMaxBands];
-    for (std::size_t band = 0; band < bands; ++band) c[band] = planes[band][i];
+    kernels::LoadPixel<bands>(pixels + i * bands, c);
     projection[i] = ProjectionOf<order, bands>(c, weights);
   }
 }
@@ -105,14 +103,17 @@ GRIDMILL_MULTIVERSION void ProjectBands(const Bands& planes, const double (&weig
 template <class In>
 void ProjectRow(const In* first, std::size_t stride, const Sensor& sensor, std::size_t count,
                 double* projection) {
-  using Project = void (*)(const Bands&, const double(&)[kMaxBands], std::size_t, double*);
-  constexpr Project kFour[] = {ProjectBands<Order::kRunning, 4>, ProjectBands<Order::kVisibleFirst, 4>,
-                               ProjectBands<Order::kMss, 4>};
-  constexpr Project kSix[] = {ProjectBands<Order::kRunning, 6>, ProjectBands<Order::kVisibleFirst, 6>};
-  Bands planes;
-  kernels::LoadPlanes(first, stride, sensor.bands, count, planes);
+  using Project = void (*)(const In*, const double(&)[kMaxBands], std::size_t, double*);
+  constexpr Project kFour[] = {ProjectPixels<Order::kRunning, 4, In>,
+                               ProjectPixels<Order::kVisibleFirst, 4, In>, ProjectPixels<Order::kMss, 4, In>};
+  constexpr Project kSix[] = {ProjectPixels<Order::kRunning, 6, In>,
+                              ProjectPixels<Order::kVisibleFirst, 6, In>};
+  In dense[kMaxBands * kBlock];
+  for (std::size_t i = 0; i < count && stride != sensor.bands; ++i)
+    std::copy_n(first + i * stride, sensor.bands, dense + i * sensor.bands);
+  const In* const pixels = stride != sensor.bands ? dense : first;
   const auto order = static_cast<std::size_t>(sensor.order);
-  (sensor.bands == 4 ? kFour[order] : kSix[order])(planes, sensor.weights, count, projection);
+  (sensor.bands == 4 ? kFour[order] : kSix[order])(pixels, sensor.weights, count, projection);
 }
 
 /// Deliberate: every type but absolute and backward is image minus reference.

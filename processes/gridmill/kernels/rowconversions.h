@@ -29,6 +29,10 @@ void LoadRow(const In* source, std::size_t stride, std::size_t count, Value* tar
 template <class In>
 const float* FloatRow(const In* source, std::size_t stride, std::size_t count, float* scratch);
 
+/// The samples as `float`: those of a dense `float` row where they stand, others converted into `scratch`.
+template <class In>
+const float* FloatRow(const In* source, std::size_t stride, std::size_t count, float* scratch);
+
 /// Converts the first `channels` samples of `count` pixels, `stride` elements apart, to planes of `double`.
 template <class In>
 void LoadPlanes(const In* first, std::size_t stride, std::size_t channels, std::size_t count,
