@@ -151,6 +151,10 @@ class House(Tree):
     def test_parallel_constructs_outside_the_frame(self):
         self.expect_in("processes/gridmill/one.cpp", "#pragma omp simd\n", ":1: a parallel construct")
 
+    def test_casts_to_an_integer_and_back(self):
+        line = "float x = tessel::PlainCast<float>(tessel::PlainCast<int>(y));\n"
+        self.expect_in("processes/gridmill/one.cpp", line, ":1: a cast to an integer and back")
+
     def test_function_like_macros(self):
         self.expect_in("processes/gridmill/one.h", "#define ONE(x) x\n", ":1: a function-like macro")
 

@@ -164,6 +164,13 @@ TEST(AverageChannels, MaskedPixelHoldsNoDataCastToTheInputAndThenToTheOutputNeit
   EXPECT_EQ((Mean<double, int>(AverageChannels(2.5f), {1}, false)), 2.0);
 }
 
+TEST(AverageChannels, MaskedPixelOfANegativeZeroKeepsItsSignOnlyInAFloatingInput) {
+  EXPECT_FALSE(std::signbit(Mean<float, int>(AverageChannels(-0.0f), {1}, false)));
+  EXPECT_FALSE(std::signbit(Mean<float, std::int64_t>(AverageChannels(-0.25f), {1}, false)));
+  EXPECT_FALSE(std::signbit(Mean<double, int>(AverageChannels(-0.0f), {1}, false)));
+  EXPECT_TRUE(std::signbit(Mean<float, float>(AverageChannels(-0.0f), {1}, false)));
+}
+
 TEST(AverageChannels, MaskedPixelOfAnImpossibleNoDataIsTheIndefiniteValueCutToTheWidth) {
   const AverageChannels average(kNaN);
   EXPECT_EQ((Mean<int, unsigned char>(average, {1}, false)), 0);
