@@ -5,6 +5,7 @@ set(GRIDMILL_SOURCES
     basic/tessel/mask/mask.cpp
     basic/tessel/raster.cpp
     processes/gridmill/averagechannels.cpp
+    processes/gridmill/bitmapfiltering.cpp
     processes/gridmill/chandiffchange.cpp
     processes/gridmill/chandiffchange2.cpp
     processes/gridmill/chanratiochange.cpp
@@ -12,18 +13,35 @@ set(GRIDMILL_SOURCES
     processes/gridmill/combchange.cpp
     processes/gridmill/filterasp.cpp
     processes/gridmill/filterslp.cpp
+    processes/gridmill/intenpercent.cpp
     processes/gridmill/intenratiochange.cpp
     processes/gridmill/magnitudechange.cpp
+    processes/gridmill/mirrorimg.cpp
+    processes/gridmill/normalize.cpp
+    processes/gridmill/percentile.cpp
     processes/gridmill/singlechange.cpp
+    processes/gridmill/sqrgradient.cpp
     processes/gridmill/tasseledcapchange.cpp
+    processes/gridmill/vegindex.cpp
+    processes/gridmill/vollath.cpp
     processes/gridmill/frame/changerows.cpp
+    processes/gridmill/frame/filterrows.cpp
+    processes/gridmill/frame/pixelwriter.cpp
+    processes/gridmill/frame/scanlock.cpp
     processes/gridmill/kernels/changenodata.cpp
     processes/gridmill/kernels/channelratio.cpp
     processes/gridmill/kernels/difference.cpp
+    processes/gridmill/kernels/focussums.cpp
     processes/gridmill/kernels/integermean.cpp
     processes/gridmill/kernels/logarithm.cpp
     processes/gridmill/kernels/maskedcells.cpp
+    processes/gridmill/kernels/orderedsums.cpp
+    processes/gridmill/kernels/percentilespline.cpp
+    processes/gridmill/kernels/pixelplanes.cpp
+    processes/gridmill/kernels/reverse.cpp
     processes/gridmill/kernels/rowconversions.cpp
+    processes/gridmill/kernels/thresholds.cpp
+    processes/gridmill/kernels/vegetation.cpp
     processes/gridmill/kernels/wholedegrees.cpp)
 list(TRANSFORM GRIDMILL_SOURCES PREPEND ${PROJECT_SOURCE_DIR}/)
 
@@ -42,6 +60,7 @@ set(GRIDMILL_HEADERS
     basic/tessel/mask/maskdecision.h
     basic/tessel/raster.h
     processes/gridmill/averagechannels.h
+    processes/gridmill/bitmapfiltering.h
     processes/gridmill/chandiffchange.h
     processes/gridmill/chandiffchange2.h
     processes/gridmill/changeparams.h
@@ -54,11 +73,18 @@ set(GRIDMILL_HEADERS
     processes/gridmill/frame/processorcache.h
     processes/gridmill/gridmill.h
     processes/gridmill/ichange.h
+    processes/gridmill/intenpercent.h
     processes/gridmill/intenratiochange.h
     processes/gridmill/iprocessor.h
     processes/gridmill/magnitudechange.h
+    processes/gridmill/mirrorimg.h
+    processes/gridmill/normalize.h
+    processes/gridmill/percentile.h
     processes/gridmill/singlechange.h
-    processes/gridmill/tasseledcapchange.h)
+    processes/gridmill/sqrgradient.h
+    processes/gridmill/tasseledcapchange.h
+    processes/gridmill/vegindex.h
+    processes/gridmill/vollath.h)
 
 # gridmill_objects(<name> <isa>): the compiled sources for one setting of GRIDMILL_ISA.
 function(gridmill_objects name isa)

@@ -116,6 +116,62 @@ TYPED_TEST(TerrainOperator, AMarginBelow1IsAFailureOfTheParameterPoRasterIn) {
   }
 }
 
+template <class Operator>
+class UnguardedOperator : public ::testing::Test {};
+using UnguardedOperators =
+    ::testing::Types<filters::MirrorImg, filters::Normalize, filters::Percentile, filters::VegIndex>;
+TYPED_TEST_SUITE(UnguardedOperator, UnguardedOperators);
+
+TYPED_TEST(UnguardedOperator, TheExtendedDispatcherKnowsNeitherBitNorComplexTypes) {
+  const Failure expected = Plain("Invalid type requested.");
+  Raster bytes = MakeRaster(tessel::eDT_8U);
+  for (const DataType type : {DataType(tessel::eDT_BIT), DataType(tessel::eDT_8U, true), DataType()}) {
+    Raster odd = MakeRaster(type);
+    EXPECT_EQ(FailureOf([&] { TypeParam().Process(&odd, nullptr, &bytes); }), expected);
+    EXPECT_EQ(FailureOf([&] { TypeParam().Process(&bytes, nullptr, &odd); }), expected);
+  }
+}
+
+template <class Operator>
+class HalfComparedOperator : public ::testing::Test {};
+using HalfComparedOperators = ::testing::Types<filters::BitmapFiltering, filters::IntenPercent>;
+TYPED_TEST_SUITE(HalfComparedOperator, HalfComparedOperators);
+
+TYPED_TEST(HalfComparedOperator, TheTwoLevelDispatcherKnowsNoBitType) {
+  const Failure expected = Plain("Invalid type to dispatch.");
+  Raster bits = MakeRaster(tessel::eDT_BIT);
+  Raster bytes = MakeRaster(tessel::eDT_8U);
+  EXPECT_EQ(FailureOf([&] { TypeParam().Process(&bits, nullptr, &bytes); }), expected);
+  EXPECT_EQ(FailureOf([&] { TypeParam().Process(&bytes, nullptr, &bits); }), expected);
+}
+
+TEST(Failures, IntenPercentKnowsNoComplexTypes) {
+  const Failure expected = Plain("Invalid type to dispatch.");
+  Raster complex = MakeRaster(DataType(tessel::eDT_32F, true));
+  Raster bytes = MakeRaster(tessel::eDT_8U);
+  EXPECT_EQ(FailureOf([&] { filters::IntenPercent().Process(&complex, nullptr, &bytes); }), expected);
+  EXPECT_EQ(FailureOf([&] { filters::IntenPercent().Process(&bytes, nullptr, &complex); }), expected);
+}
+
+template <class Operator>
+class FocusMeasure : public ::testing::Test {};
+using FocusMeasures = ::testing::Types<filters::SqrGradientEvaluation, filters::VollathEvaluation>;
+TYPED_TEST_SUITE(FocusMeasure, FocusMeasures);
+
+TYPED_TEST(FocusMeasure, ANullInputIsToldFirstThenThatChannelsAreMissingThenTheType) {
+  Raster noChannels({3, 2, 0, DataType(tessel::eDT_BIT)}, {});
+  Raster bits = MakeRaster(tessel::eDT_BIT);
+  Raster complex = MakeRaster(DataType(tessel::eDT_8U, true));
+  EXPECT_EQ(FailureOf([] { TypeParam().Process(nullptr, nullptr, nullptr); }),
+            Plain("poRasterIn is invalid pointer"));
+  EXPECT_EQ(FailureOf([&] { TypeParam().Process(&noChannels, nullptr, nullptr); }),
+            Plain("poRasterIn must have minimum 1 channels."));
+  EXPECT_EQ(FailureOf([&] { TypeParam().Process(&bits, nullptr, nullptr); }),
+            Plain("Invalid type requested."));
+  EXPECT_EQ(FailureOf([&] { TypeParam().Process(&complex, nullptr, nullptr); }),
+            Plain("Invalid type requested."));
+}
+
 TEST(Failures, AMaskGoesIntoBitAndByteRastersOnly) {
   Raster target = MakeRaster(tessel::eDT_16U);
   const Failure expected{&typeid(DataException), "We can only rasterize into a eDT_BIT or eDT_8U Raster"};

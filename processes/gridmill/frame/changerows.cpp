@@ -1,12 +1,9 @@
 #include "processes/gridmill/frame/changerows.h"
 
+#include <algorithm>
 #include <cstdint>
 #include <cstring>
 #include <vector>
-
-#ifdef __SSE2__
-#include <emmintrin.h>
-#endif
 
 #include "basic/tessel/mask/maskrow.h"
 #include "basic/tessel/samples.h"
@@ -21,17 +18,6 @@ using tessel::PixelOffset;
 using tessel::Raster;
 
 std::size_t BytesOf(const DataType& element) { return element.sizeBits / 8; }
-
-/// Elements of a pixel: two for each channel of a complex raster.
-std::size_t ElementsOf(const Raster& raster) {
-  return std::size_t{raster.channels} * (raster.dataType.isComplex ? 2 : 1);
-}
-
-/// True if the raster holds elements of this type, real or complex.
-bool Holds(const Raster& raster, DataType element) {
-  element.isComplex = raster.dataType.isComplex;
-  return raster.dataType == element;
-}
 
 /// Pixels read as elements of one type.
 class PixelReader {
@@ -63,69 +49,6 @@ class PixelReader {
   std::vector<unsigned char> gathered_;
 };
 
-/// Outputs of more bytes than this are written past the caches, which they would not fit into: the lines need
-/// not be read first.
-constexpr std::uint64_t kStreamedBytes = std::uint64_t{32} << 20;
-
-void StreamBytes(const unsigned char* source, std::size_t count, unsigned char* target) {
-#ifdef __SSE2__
-  const std::size_t head = std::min(count, -reinterpret_cast<std::uintptr_t>(target) % sizeof(__m128i));
-  std::memcpy(target, source, head);
-  std::size_t i = head;
-  for (; i + sizeof(__m128i) <= count; i += sizeof(__m128i))
-    _mm_stream_si128(reinterpret_cast<__m128i*>(target + i),
-                     _mm_loadu_si128(reinterpret_cast<const __m128i*>(source + i)));
-  std::memcpy(target + i, source + i, count - i);
-#else
-  std::memcpy(target, source, count);
-#endif
-}
-
-/// Takes the samples of an output's pixels.
-class PixelWriter {
- public:
-  PixelWriter(const Raster& raster, const DataType& element, const BlockShape& shape)
-      : raster_(raster),
-        bytes_(shape.outSamples * BytesOf(element)),
-        pixelBytes_(ElementsOf(raster) * BytesOf(element)),
-        streams_(pixelBytes_ == bytes_ && raster.dataSize > kStreamedBytes) {
-    if (!InPlace()) block_.resize(shape.pixels * bytes_);
-  }
-  PixelWriter(const PixelWriter&) = delete;
-  PixelWriter& operator=(const PixelWriter&) = delete;
-
-  /// Other threads see streamed bytes only after the fence.
-  ~PixelWriter() {
-#ifdef __SSE2__
-    if (streams_) _mm_sfence();
-#endif
-  }
-
-  /// Where the samples of the pixels from (x, y) on are to be put.
-  unsigned char* At(std::uint32_t x, std::uint32_t y) {
-    return InPlace() ? raster_.data + PixelOffset(raster_, x, y) : block_.data();
-  }
-
-  /// Called when they are there. Pixels are written in their order: where one has fewer samples than are
-  /// written, the next one prevails.
-  void Write(std::uint32_t x, std::uint32_t y, std::size_t pixels) const {
-    if (InPlace() || bytes_ == 0) return;
-    unsigned char* const row = raster_.data + PixelOffset(raster_, x, y);
-    if (streams_) return StreamBytes(block_.data(), pixels * bytes_, row);
-    for (std::size_t i = 0; i < pixels; ++i)
-      std::memcpy(row + i * pixelBytes_, block_.data() + i * bytes_, bytes_);
-  }
-
- private:
-  bool InPlace() const { return pixelBytes_ == bytes_ && !streams_; }
-
-  const Raster& raster_;
-  std::size_t bytes_;  // of a pixel that are written
-  std::size_t pixelBytes_;
-  bool streams_;
-  std::vector<unsigned char> block_;
-};
-
 /// Fills `valid` for the pixels from (x, y) on if there is a mask; returns whether one of them is excluded.
 bool UnpackMasks(const TwoDates& dates, std::uint32_t x, std::uint32_t y, std::size_t pixels,
                  unsigned char* valid) {
@@ -152,7 +75,7 @@ void WalkBlocks(const TwoDates& dates, const BlockShape& shape, const ElementTyp
                 const std::function<void(const RawBlock&)>& row) {
   PixelReader image(dates.image, types.image, shape.imageSamples, shape);
   PixelReader reference(dates.reference, types.reference, shape.referenceSamples, shape);
-  PixelWriter out(dates.out, types.out, shape);
+  PixelWriter out(dates.out, types.out, shape.outSamples, shape.pixels);
   const std::size_t width = dates.image.width;
   SerialRows(dates.image.height, [&](std::uint32_t y) {
     for (std::size_t done = 0; done < width; done += shape.pixels) {

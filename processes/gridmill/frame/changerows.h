@@ -1,12 +1,12 @@
 #pragma once
 
-#include <algorithm>
 #include <cstddef>
 #include <functional>
 
 #include "basic/tessel/datatype.h"
 #include "basic/tessel/mask/mask.h"
 #include "basic/tessel/raster.h"
+#include "processes/gridmill/frame/pixelwriter.h"
 
 /// The walk of the change operators over the pixels of two dates.
 namespace orvik::frame {
@@ -21,8 +21,7 @@ struct TwoDates {
   const tessel::Mask* referenceMask = nullptr;  ///< deliberate: a set bit excludes the pixel
 };
 
-/// Pixels of a block at most, and of one whose pixels are single results.
-inline constexpr std::size_t kMaxBlock = 2048;
+/// Pixels of a block whose pixels are single results.
 inline constexpr std::size_t kPixelBlock = 256;
 
 /// How an operator takes its pixels.
@@ -38,9 +37,7 @@ struct BlockShape {
 ///
 /// @param samples  of a block at most, in whole vectors where pixels are not large
 inline BlockShape SampleBlocks(std::size_t channels, std::size_t samples = 2048) {
-  const std::size_t pixels = std::min(kMaxBlock, samples / std::max<std::size_t>(channels, 1));
-  return {pixels >= 64 ? pixels & ~std::size_t{63} : std::max<std::size_t>(pixels, 1), channels, channels,
-          channels, true};
+  return {DensePixels(channels, samples), channels, channels, channels, true};
 }
 
 /// For operators that make one result of all samples of a pixel.

@@ -7,6 +7,7 @@
 #include "basic/core/typedispatch/extendtypedispatch.h"
 #include "basic/core/typedispatch/typedispatch.h"
 #include "basic/core/typedispatch/typelist.h"
+#include "basic/exceptions/throw.h"
 #include "basic/tessel/datatype.h"
 
 namespace orvik::frame {
@@ -37,6 +38,17 @@ struct TwoLevel {
   template <std::size_t N>
   static typename Level::Interface Dispatch(const Types<N>& types) {
     return Level::Dispatch(types.front(), types.back());
+  }
+};
+
+/// The same for an operator that has no complex form of its pixels.
+template <class CreationPolicy>
+struct RealTwoLevel : TwoLevel<CreationPolicy> {
+  template <std::size_t N>
+  static auto Dispatch(const Types<N>& types) {
+    if (types.front().isComplex || types.back().isComplex)
+      Throw<Exception>("Invalid type to dispatch.", ORVIK_HERE);
+    return TwoLevel<CreationPolicy>::Dispatch(types);
   }
 };
 

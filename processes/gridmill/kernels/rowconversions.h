@@ -29,9 +29,9 @@ void LoadRow(const In* source, std::size_t stride, std::size_t count, Value* tar
 template <class In>
 const float* FloatRow(const In* source, std::size_t stride, std::size_t count, float* scratch);
 
-/// The samples as `float`: those of a dense `float` row where they stand, others converted into `scratch`.
-template <class In>
-const float* FloatRow(const In* source, std::size_t stride, std::size_t count, float* scratch);
+/// Copies `count` samples, `stride` elements apart.
+template <class Sample>
+void CopyRow(const Sample* source, std::size_t stride, std::size_t count, Sample* target);
 
 /// Converts the first `channels` samples of `count` pixels, `stride` elements apart, to planes of `double`.
 template <class In>
