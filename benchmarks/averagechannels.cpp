@@ -25,13 +25,6 @@ float PixelMean(const In* pixel, std::size_t channels) {
   return sum / static_cast<float>(channels);
 }
 
-unsigned char ToByte(float value) {
-  const float rounded = value + 0.5f;
-  if (rounded >= 255.0f) return 255;
-  if (rounded <= 0.0f) return 0;
-  return static_cast<unsigned char>(rounded);
-}
-
 void NaiveByteMean(const Workload& work) {
   const std::size_t channels = work.in->channels;
   for (std::size_t y = 0; y < work.in->height; ++y) {

@@ -1,9 +1,10 @@
 #include <algorithm>
 #include <cstdint>
 #include <cstdio>
-#include <cstring>
+#include <ios>
 #include <regex>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include <benchmark/benchmark.h>
@@ -49,9 +50,11 @@ int RegisterRow(const Row& row, const Size& size, bool quick, const std::regex& 
 int RegisterRows(bool quick, const std::regex& filter) {
   int registered = 0;
   for (const auto rows :
-       {FilterSlpRows(), FilterAspRows(), AverageChannelsRows(), SingleChangeRows(), ChanDiffChangeRows(),
-        ChanDiffChange2Rows(), ChanRatioChangeRows(), ChanRatioChange2Rows(), CombChangeRows(),
-        IntenRatioChangeRows(), MagnitudeChangeRows(), TasseledCapChangeRows()})
+       {FilterSlpRows(),       FilterAspRows(),        AverageChannelsRows(), SingleChangeRows(),
+        ChanDiffChangeRows(),  ChanDiffChange2Rows(),  ChanRatioChangeRows(), ChanRatioChange2Rows(),
+        CombChangeRows(),      IntenRatioChangeRows(), MagnitudeChangeRows(), TasseledCapChangeRows(),
+        VegIndexRows(),        NormalizeRows(),        PercentileRows(),      IntenPercentRows(),
+        BitmapFilteringRows(), MirrorImgRows(),        SqrGradientRows(),     VollathRows()})
     for (const Row& row : rows)
       for (const Size& size : kSizes) registered += RegisterRow(row, size, quick, filter);
   return registered;
@@ -66,16 +69,30 @@ class Progress : public benchmark::BenchmarkReporter {
   }
 };
 
-/// Takes the flag `--quick` out of the arguments.
-bool TakeQuick(int& count, char** arguments) {
-  for (int i = 1; i < count; ++i) {
-    if (std::strcmp(arguments[i], "--quick") != 0) continue;
-    std::copy(arguments + i + 1, arguments + count, arguments + i);
-    --count;
+/// Takes the flag `--quick` out of the arguments, and `--samples=FOLDER`.
+class Options {
+ public:
+  bool quick = false;
+  std::string sampleFolder;
+
+  Options(int& count, char** arguments) {
+    const auto end = std::remove_if(arguments + 1, arguments + count,
+                                    [this](std::string_view argument) { return Take(argument); });
+    count = static_cast<int>(end - arguments);
+  }
+
+ private:
+  bool Take(std::string_view argument) {
+    constexpr std::string_view kSamples = "--samples=";
+    if (argument.starts_with(kSamples)) {
+      sampleFolder = argument.substr(kSamples.size());
+      return true;
+    }
+    if (argument != "--quick") return false;
+    quick = true;
     return true;
   }
-  return false;
-}
+};
 
 /// Runs the rows that the filter names. The library would match its own names, which go on with
 /// "/iterations:...": "ratio" and "time" occur in each of them.
@@ -84,6 +101,8 @@ int Run(bool quick, const std::string& filter) {
     std::fprintf(stderr, "no row matches '%s'\n", filter.c_str());
     return 2;
   }
+  // An operator traces its calls to the standard output, which nothing here uses.
+  if (std::freopen("/dev/null", "w", stdout) == nullptr) return 1;
   Progress progress;
   benchmark::RunSpecifiedBenchmarks(&progress, std::string("."));
   return 0;
@@ -94,15 +113,19 @@ int Run(bool quick, const std::string& filter) {
 }  // namespace orvik::bench
 
 int main(int argc, char** argv) {
-  const bool quick = orvik::bench::TakeQuick(argc, argv);
-  if (quick) orvik::bench::SetSlice(0.005);
+  const orvik::bench::Options options(argc, argv);
+  if (options.quick) orvik::bench::SetSlice(0.005);
+  orvik::bench::SetSampleFolder(options.sampleFolder);
   benchmark::Initialize(&argc, argv);
   if (benchmark::ReportUnrecognizedArguments(argc, argv)) return 2;
   const std::string filter = benchmark::GetBenchmarkFilter();
   try {
-    return orvik::bench::Run(quick, filter);
+    return orvik::bench::Run(options.quick, filter);
   } catch (const std::regex_error&) {
     std::fprintf(stderr, "'%s' is not a regular expression\n", filter.c_str());
     return 2;
+  } catch (const std::ios_base::failure& failure) {
+    std::fprintf(stderr, "cannot write a sample: %s\n", failure.what());
+    return 1;
   }
 }

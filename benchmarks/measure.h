@@ -1,6 +1,7 @@
 #pragma once
 
 #include <cstdint>
+#include <string>
 
 #include <benchmark/benchmark.h>
 
@@ -13,12 +14,16 @@ namespace orvik::bench {
 /// median of the rounds, and as "vs <name>" the median of the rounds' ratios to it.
 ///
 /// The clock is the processor time of the thread, so that other programs on the machine count for little.
-/// The row fails before it is timed if gridmill and its naive twin differ in a bit.
+/// The row fails before it is timed if gridmill and its naive twin differ in a bit, or gridmill and a peer in
+/// the same quantity by more than the row's `peersWithin`. The label is the row's `python`.
 void MeasureRow(benchmark::State& state, const Row& row, std::uint32_t size);
 
 /// Measures gridmill with two threads against one, by the wall clock: the best of many single calls, those in
 /// which no other program held a core.
 void MeasureTwoThreads(benchmark::State& state, const Row& row, std::uint32_t size);
+
+/// Where `MeasureRow` writes the samples of rows with a name for Python (see `WriteSample`); "": nowhere.
+void SetSampleFolder(const std::string& folder);
 
 /// How long each contestant of `MeasureRow` runs within a round, at least; one call takes what it takes.
 void SetSlice(double seconds);

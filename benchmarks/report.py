@@ -5,7 +5,7 @@ import json
 import os
 import sys
 
-SPEEDS = ("gridmill", "naive", "opencv", "gdal", "one_core", "roof")
+SPEEDS = ("gridmill", "naive", "vectorised", "opencv", "gdal", "numpy", "numba", "one_core", "roof")
 
 
 def read_rows(path):
@@ -44,8 +44,8 @@ def cells(row):
 
 
 def print_table(rows):
-    titles = ["job", "types", "size", "gridmill", "naive", "", "opencv", "", "gdal", "", "1 core", "", "roof"]
-    titles.append("share")
+    others = [text for name in SPEEDS[1:-1] for text in (name.replace("one_", "1 "), "")]
+    titles = ["job", "types", "size", "gridmill", *others, "roof", "share"]
     table = [titles] + [cells(row) for row in rows if row["failure"] is None]
     shown = [i for i in range(len(titles)) if any(line[i] for line in table[1:])]
     widths = {i: max(len(line[i]) for line in table) for i in shown}

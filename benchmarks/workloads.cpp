@@ -1,5 +1,6 @@
 #include "benchmarks/workloads.h"
 
+#include <algorithm>
 #include <array>
 #include <cmath>
 #include <random>
@@ -104,6 +105,49 @@ void FillDate(tessel::Raster& raster, bool second) {
   });
 }
 
+template <class Pixel>
+void FillScene(tessel::Raster& raster) {
+  const Surface shared(raster.bufferWidth, 0.3f);
+  const std::vector<Surface> own = SurfacesFor(raster);
+  const float gain = sizeof(Pixel) == 1 ? 0x1p-7f : 1.0f;
+  Random random(1);
+  bool dead = false;
+  Fill<Pixel>(raster, [&](std::size_t x, std::size_t y, std::size_t c) {
+    if (c == 0) dead = IsInCollar(x, y, raster.width) || random() % 4096 == 0;
+    const float sample =
+        17000.0f + 23.0f * shared.At(x, y) + 6.0f * own[c].At(x, y) + 1500.0f * Noise(random);
+    return dead ? 0.0f : gain * sample;
+  });
+}
+
+/// `use(sample, c)` for each sample other than 0.
+template <class Pixel, class Use>
+void ForEachSample(const tessel::Raster& raster, const Use& use) {
+  const Pixel* element = reinterpret_cast<const Pixel*>(raster.data);
+  for (std::size_t pixel = 0; pixel < std::size_t{raster.bufferWidth} * raster.bufferHeight; ++pixel)
+    for (std::size_t c = 0; c < raster.channels; ++c, ++element)
+      if (*element != Pixel{0}) use(static_cast<float>(*element), c);
+}
+
+template <class Pixel>
+Histogram HistogramOf(const tessel::Raster& raster, int bins) {
+  Histogram histogram;
+  histogram.bins = bins;
+  histogram.minimum.assign(raster.channels, 1e9f);
+  histogram.maximum.assign(raster.channels, 0.0f);
+  ForEachSample<Pixel>(raster, [&](float sample, std::size_t c) {
+    histogram.minimum[c] = std::fmin(histogram.minimum[c], sample);
+    histogram.maximum[c] = std::fmax(histogram.maximum[c], sample);
+  });
+  histogram.counts.assign(raster.channels * static_cast<std::size_t>(bins), 0);
+  ForEachSample<Pixel>(raster, [&](float sample, std::size_t c) {
+    const float scale = static_cast<float>(bins) / (histogram.maximum[c] - histogram.minimum[c]);
+    const int bin = std::min(static_cast<int>((sample - histogram.minimum[c]) * scale), bins - 1);
+    ++histogram.counts[c * static_cast<std::size_t>(bins) + static_cast<std::size_t>(bin)];
+  });
+  return histogram;
+}
+
 template <class In, class Out>
 Workload MakeWorkload(std::uint32_t size, std::uint32_t inChannels, std::uint32_t outChannels,
                       std::uint32_t margin, MaskPattern pattern) {
@@ -159,6 +203,43 @@ Workload Dates(std::uint32_t size) {
   return workload;
 }
 
+template <class In, class Out, std::uint32_t channels, std::uint32_t outChannels>
+Workload Scene(std::uint32_t size) {
+  Workload workload = MakeWorkload<In, Out>(size, channels, outChannels, 0, MaskPattern::kNone);
+  FillScene<In>(*workload.in);
+  return workload;
+}
+
+template <class In, class Out, std::uint32_t channels, std::uint32_t outChannels>
+Workload RankedScene(std::uint32_t size) {
+  Workload workload = Scene<In, Out, channels, outChannels>(size);
+  workload.histogram = HistogramOf<In>(*workload.in, 256);
+  return workload;
+}
+
+template <class In, std::uint32_t channels, std::uint32_t sums>
+Workload SummedScene(std::uint32_t size) {
+  const tessel::RasterInfo inInfo(size, size, channels, tessel::DataType::Of<In>());
+  const tessel::RasterInfo outInfo(1, 1, sums, tessel::DataType::Of<double>());
+  Workload workload;
+  workload.in = std::make_unique<tessel::Raster>(inInfo, tessel::RasterContext());
+  workload.out = std::make_unique<tessel::Raster>(outInfo, tessel::RasterContext());
+  workload.twin = std::make_unique<tessel::Raster>(outInfo, tessel::RasterContext());
+  FillScene<In>(*workload.in);
+  return workload;
+}
+
+template <class In, class Out, MaskPattern pattern>
+Workload Speckle(std::uint32_t size) {
+  Workload workload = MakeWorkload<In, Out>(size, 1, 1, 0, pattern);
+  const Surface surface(size, 0.3f);
+  Random random(1);
+  Fill<In>(*workload.in, [&](std::size_t x, std::size_t y, std::size_t) {
+    return 17000.0f + 14.0f * surface.At(x, y) + 7000.0f * Noise(random);
+  });
+  return workload;
+}
+
 template Workload Elevations<float, float, 1, MaskPattern::kNone>(std::uint32_t);
 template Workload Elevations<float, float, 3, MaskPattern::kRandom>(std::uint32_t);
 template Workload Elevations<float, float, 3, MaskPattern::kRuns>(std::uint32_t);
@@ -181,5 +262,23 @@ template Workload Dates<unsigned short, unsigned short, float, 4, 4, MaskPattern
 template Workload Dates<unsigned short, unsigned short, float, 6, 3, MaskPattern::kNone>(std::uint32_t);
 template Workload Dates<short, unsigned short, float, 1, 1, MaskPattern::kNone>(std::uint32_t);
 template Workload Dates<float, float, float, 1, 1, MaskPattern::kNone>(std::uint32_t);
+template Workload Scene<unsigned char, unsigned char, 3, 3>(std::uint32_t);
+template Workload Scene<unsigned short, float, 3, 3>(std::uint32_t);
+template Workload Scene<unsigned short, float, 4, 1>(std::uint32_t);
+template Workload Scene<unsigned short, float, 7, 12>(std::uint32_t);
+template Workload Scene<float, float, 1, 1>(std::uint32_t);
+template Workload RankedScene<unsigned short, unsigned char, 3, 3>(std::uint32_t);
+template Workload RankedScene<float, float, 1, 1>(std::uint32_t);
+template Workload RankedScene<float, float, 3, 4>(std::uint32_t);
+template Workload SummedScene<unsigned char, 1, 1>(std::uint32_t);
+template Workload SummedScene<unsigned char, 1, 2>(std::uint32_t);
+template Workload SummedScene<unsigned short, 1, 2>(std::uint32_t);
+template Workload SummedScene<float, 1, 1>(std::uint32_t);
+template Workload SummedScene<float, 1, 2>(std::uint32_t);
+template Workload SummedScene<float, 4, 4>(std::uint32_t);
+template Workload SummedScene<float, 4, 8>(std::uint32_t);
+template Workload Speckle<unsigned short, unsigned char, MaskPattern::kNone>(std::uint32_t);
+template Workload Speckle<unsigned short, unsigned char, MaskPattern::kRandom>(std::uint32_t);
+template Workload Speckle<unsigned short, unsigned char, MaskPattern::kRuns>(std::uint32_t);
 
 }  // namespace orvik::bench

@@ -3,11 +3,21 @@
 #include <cstddef>
 #include <cstdint>
 #include <memory>
+#include <vector>
 
 #include "basic/tessel/mask/mask.h"
 #include "basic/tessel/raster.h"
 
 namespace orvik::bench {
+
+/// Counts of the samples other than 0 in bins of equal width, for each channel, from its least to its
+/// greatest.
+struct Histogram {
+  int bins = 0;
+  std::vector<float> minimum;
+  std::vector<float> maximum;
+  std::vector<int> counts;  ///< of bin i of channel c at `bins` c + i
+};
 
 /// What the contestants of a row work on. They read `in`, `reference` and `mask`; gridmill writes `out`, all
 /// others `twin`.
@@ -17,6 +27,7 @@ struct Workload {
   std::unique_ptr<tessel::Mask> mask;         ///< null: every pixel is valid
   std::unique_ptr<tessel::Raster> out;
   std::unique_ptr<tessel::Raster> twin;
+  Histogram histogram;  ///< of `in`; empty: the job needs none
 
   std::size_t Pixels() const { return std::size_t{in->width} * in->height; }
 
@@ -31,6 +42,14 @@ enum class MaskPattern { kNone, kRandom, kRuns };
 
 /// The distance of two neighbouring elevations, in the elevations' unit.
 inline constexpr float kSpacing = 10.0f;
+
+/// The range of a channel of `Scene` that is stretched from 0 to 100, a tenth of the samples beyond each end.
+inline constexpr float kStretchFrom[] = {13000.0f, 12500.0f, 12000.0f};
+inline constexpr float kStretchTo[] = {21000.0f, 21500.0f, 22000.0f};
+
+/// Half of the samples of `Speckle`, from field to field and from pixel to pixel.
+inline constexpr float kRangeFrom = 13500.0f;
+inline constexpr float kRangeTo = 20500.0f;
 
 /// Hills of three wavelengths with a little noise, slopes from 0 to 60 degrees, and a margin of 1. The output
 /// has as many channels.
@@ -48,10 +67,35 @@ template <class In, class Ref, class Out, std::uint32_t channels, std::uint32_t 
           MaskPattern pattern = MaskPattern::kNone>
 Workload Dates(std::uint32_t size);
 
+/// A scene in correlated bands: waves that all bands share, weaker ones of each band's own and a little
+/// noise, from about 5000 to 30000, of 8 bits the 128th part. No-data (0) as in `Bands`.
+template <class In, class Out, std::uint32_t channels, std::uint32_t outChannels>
+Workload Scene(std::uint32_t size);
+
+/// The same with a histogram of 256 bins.
+template <class In, class Out, std::uint32_t channels, std::uint32_t outChannels>
+Workload RankedScene(std::uint32_t size);
+
+/// The same scene for jobs that give sums: the output is one pixel of `sums` doubles.
+template <class In, std::uint32_t channels, std::uint32_t sums>
+Workload SummedScene(std::uint32_t size);
+
+/// Noise from 10000 to 24000 on waves of up to 5000, in one channel.
+template <class In, class Out, MaskPattern pattern = MaskPattern::kNone>
+Workload Speckle(std::uint32_t size);
+
 /// The bit of pixel (x, y), tested as the text-book has it.
 inline bool IsValid(const tessel::Mask& mask, std::size_t x, std::size_t y) {
   const std::size_t bit = (mask.marginY + y) * mask.bufferWidth + mask.marginX + x;
   return (mask.bits[bit >> 3] >> (7 - (bit & 7)) & 1) != 0;
+}
+
+/// A value as a byte: rounded and clamped.
+inline unsigned char ToByte(float value) {
+  const float rounded = value + 0.5f;
+  if (rounded >= 255.0f) return 255;
+  if (rounded <= 0.0f) return 0;
+  return static_cast<unsigned char>(rounded);
 }
 
 /// Sample 0 of pixel (0, y) of a raster whose type is known.

@@ -1,4 +1,6 @@
 #include <algorithm>
+#include <array>
+#include <cstring>
 
 #include <opencv2/core.hpp>
 #include <opencv2/imgproc.hpp>
@@ -16,6 +18,9 @@ constexpr int kMeanStrip = 64;
 constexpr int kUnlikeDifferenceStrip = 32;
 /// The same as a number of pixels, where that is the better measure of a strip.
 constexpr int kDecibelsPixels = 65536;
+constexpr int kNdviPixels = 32768;
+constexpr int kStretchPixels = 16384;
+constexpr int kBitmapPixels = 65536;
 /// A single call does best with all rows at once.
 constexpr int kAllRows = 1 << 30;
 
@@ -48,6 +53,67 @@ void Gradient(const Workload& work, int y, int rows, cv::Mat& dx, cv::Mat& dy) {
   const cv::Mat z00 = View(*work.in, 0, y, rows);
   cv::subtract(View(*work.in, 1, y, rows), z00, dx);
   cv::subtract(View(*work.in, 0, y + 1, rows), z00, dy);
+}
+
+/// The rows of a strip of so many pixels.
+int RowsOf(const Workload& work, int pixels) {
+  return std::max(1, pixels / static_cast<int>(work.in->width));
+}
+
+/// Rows of samples that repeat a constant for each of three channels.
+struct StretchConstants {
+  cv::Mat from, range, gain;
+
+  void Prepare(int width, int rows) {
+    if (from.rows == rows && from.cols == 3 * width) return;
+    cv::Mat firsts(1, 3, CV_16U), ranges(1, 3, CV_16U), gains(1, 3, CV_32F);
+    for (int c = 0; c < 3; ++c) {
+      const float span = kStretchTo[c] - kStretchFrom[c];
+      firsts.at<unsigned short>(c) = static_cast<unsigned short>(kStretchFrom[c]);
+      ranges.at<unsigned short>(c) = static_cast<unsigned short>(span);
+      gains.at<float>(c) = 100.0f / span;
+    }
+    cv::repeat(firsts, rows, width, from);
+    cv::repeat(ranges, rows, width, range);
+    cv::repeat(gains, rows, width, gain);
+  }
+};
+
+/// A strip of one value, for `inRange` and `bitwise_and`, which are slower with scalars.
+struct Constant {
+  cv::Mat values;
+
+  Constant(int type, double value) : values(1, kBitmapPixels, type, cv::Scalar(value)) {}
+  cv::Mat As(const cv::Mat& strip) const {
+    return values.colRange(0, strip.rows * strip.cols).reshape(1, strip.rows);
+  }
+};
+
+struct RangeConstants {
+  Constant from{CV_16U, kRangeFrom};
+  Constant to{CV_16U, kRangeTo};
+  Constant one{CV_8U, 1.0};
+};
+
+/// The mask's bits of some rows as bytes of 0 or 1, eight at a time; a row is whole bytes.
+void UnpackBits(const tessel::Mask& mask, int y, int rows, cv::Mat& valid) {
+  static const auto kBytes = [] {
+    std::array<std::array<unsigned char, 8>, 256> bytes{};
+    for (std::size_t v = 0; v < 256; ++v)
+      for (std::size_t i = 0; i < 8; ++i) bytes[v][i] = v >> (7 - i) & 1;
+    return bytes;
+  }();
+  valid.create(rows, static_cast<int>(mask.width), CV_8U);
+  const unsigned char* const bits = mask.bits.data() + static_cast<std::size_t>(y) * mask.width / 8;
+  unsigned char* const bytes = valid.data;
+  const std::size_t count = valid.total() / 8;
+  for (std::size_t i = 0; i < count; ++i) std::memcpy(bytes + 8 * i, kBytes[bits[i]].data(), 8);
+}
+
+void Flip(const Workload& work, int axis) {
+  [[maybe_unused]] static const bool serial = (cv::setNumThreads(1), true);
+  cv::Mat target = View(*work.twin, 0, 0, static_cast<int>(work.in->height));
+  cv::flip(View(*work.in, 0, 0, static_cast<int>(work.in->height)), target, axis);
 }
 
 }  // namespace
@@ -130,7 +196,7 @@ void OpenCvDecibels(const Workload& work) {
   };
   const auto width = static_cast<int>(work.in->width);
   cv::Mat decibels(static_cast<int>(work.in->height), width, CV_32F, work.twin->data);
-  ForEachStrip(work, std::max(1, kDecibelsPixels / width), [&](int y, int rows) {
+  ForEachStrip(work, RowsOf(work, kDecibelsPixels), [&](int y, int rows) {
     sum(View(*work.in, 0, y, rows), image);
     sum(View(*work.reference, 0, y, rows), reference);
     cv::divide(image, reference, image);
@@ -138,6 +204,76 @@ void OpenCvDecibels(const Workload& work) {
     cv::Mat target = decibels.rowRange(y, y + rows);
     image.convertTo(target, CV_32F, 4.3429448190325183);
   });
+}
+
+/// Two channels taken out are faster than all four split; 0 / 0 is patched afterwards.
+void OpenCvNdvi(const Workload& work) {
+  cv::Mat band, red, nir, difference;
+  const auto extract = [&](const cv::Mat& bands, int channel, cv::Mat& target) {
+    cv::extractChannel(bands, band, channel);
+    band.convertTo(target, CV_32F);
+  };
+  ForEachStrip(work, RowsOf(work, kNdviPixels), [&](int y, int rows) {
+    extract(View(*work.in, 0, y, rows), 2, red);
+    extract(View(*work.in, 0, y, rows), 3, nir);
+    cv::subtract(nir, red, difference);
+    cv::add(nir, red, nir);
+    cv::Mat target = View(*work.twin, 0, y, rows);
+    cv::divide(difference, nir, target);
+    cv::patchNaNs(target);
+  });
+}
+
+/// Clamped as integers, then scaled, on rows of samples beside rows of the channels' constants: faster than
+/// planes, scalars or `transform`. The constants are prepared once and not counted.
+void OpenCvStretch(const Workload& work) {
+  static StretchConstants constants;
+  const int stripRows = RowsOf(work, kStretchPixels);
+  constants.Prepare(static_cast<int>(work.in->width), stripRows);
+  cv::Mat above;
+  ForEachStrip(work, stripRows, [&](int y, int rows) {
+    cv::subtract(View(*work.in, 0, y, rows).reshape(1), constants.from.rowRange(0, rows), above);
+    cv::min(above, constants.range.rowRange(0, rows), above);
+    cv::Mat target = View(*work.twin, 0, y, rows).reshape(1);
+    above.convertTo(target, CV_32F);
+    cv::multiply(target, constants.gain.rowRange(0, rows), target);
+  });
+}
+
+void OpenCvBitmap(const Workload& work) {
+  static const RangeConstants constants;
+  cv::Mat inside;
+  ForEachStrip(work, RowsOf(work, kBitmapPixels), [&](int y, int rows) {
+    const cv::Mat source = View(*work.in, 0, y, rows);
+    cv::inRange(source, constants.from.As(source), constants.to.As(source), inside);
+    cv::Mat target = View(*work.twin, 0, y, rows);
+    cv::bitwise_and(inside, constants.one.As(source), target);
+  });
+}
+
+/// The mask's bits are unpacked to bytes of 0 or 1 in each call, and counted.
+void OpenCvMaskedBitmap(const Workload& work) {
+  static const RangeConstants constants;
+  cv::Mat inside, valid;
+  ForEachStrip(work, RowsOf(work, kBitmapPixels), [&](int y, int rows) {
+    const cv::Mat source = View(*work.in, 0, y, rows);
+    cv::inRange(source, constants.from.As(source), constants.to.As(source), inside);
+    UnpackBits(*work.mask, y, rows, valid);
+    cv::Mat target = View(*work.twin, 0, y, rows);
+    cv::bitwise_and(inside, valid, target);
+  });
+}
+
+void OpenCvMirrorColumns(const Workload& work) { Flip(work, 1); }
+
+void OpenCvMirrorRows(const Workload& work) { Flip(work, 0); }
+
+void OpenCvSquaredGradient(const Workload& work) {
+  [[maybe_unused]] static const bool serial = (cv::setNumThreads(1), true);
+  const int pairs = static_cast<int>(work.in->height) - 1;
+  const cv::Mat upper = View(*work.in, 0, 0, pairs);
+  const cv::Mat lower = View(*work.in, 0, 1, pairs);
+  *RowOf<double>(*work.twin, 0) = cv::norm(upper, lower, cv::NORM_L2SQR);
 }
 
 }  // namespace orvik::bench

@@ -18,7 +18,18 @@ GRIDMILL_PEER void OpenCvRatio(const Workload& work);
 GRIDMILL_PEER void OpenCvCombination(const Workload& work);
 GRIDMILL_PEER void OpenCvDecibels(const Workload& work);
 
+GRIDMILL_PEER void OpenCvNdvi(const Workload& work);
+GRIDMILL_PEER void OpenCvStretch(const Workload& work);
+GRIDMILL_PEER void OpenCvBitmap(const Workload& work);
+GRIDMILL_PEER void OpenCvMaskedBitmap(const Workload& work);
+GRIDMILL_PEER void OpenCvMirrorColumns(const Workload& work);
+GRIDMILL_PEER void OpenCvMirrorRows(const Workload& work);
+GRIDMILL_PEER void OpenCvSquaredGradient(const Workload& work);
+
 GRIDMILL_PEER void GdalSlope(const Workload& work);
 GRIDMILL_PEER void GdalAspect(const Workload& work);
+
+/// A plain loop in `float`, left to the compiler's vectoriser.
+void VectorisedNdvi(const Workload& work);
 
 }  // namespace orvik::bench
