@@ -2,7 +2,6 @@
 // change.png
 
 #include <algorithm>
-#include <cfloat>
 #include <cmath>
 #include <filesystem>
 #include <limits>
@@ -107,20 +106,12 @@ Dates OpenDates(const ChangeOptions& options) {
   return dates;
 }
 
-// All but the alpha bands.
-std::vector<int> ValueBands(GDALDataset& dataset) {
-  std::vector<int> bands;
-  for (int band = 1; band <= dataset.GetRasterCount(); ++band)
-    if (dataset.GetRasterBand(band)->GetColorInterpretation() != GCI_AlphaBand) bands.push_back(band);
-  return bands;
-}
-
 // The bands that were asked for, else all; band by band the same at both dates.
 void ChooseBands(const ChangeOptions& options, Dates& dates) {
-  dates.afterBands = options.bands.empty() ? ValueBands(*dates.after) : options.bands;
+  dates.afterBands = options.bands.empty() ? examples::ValueBands(*dates.after) : options.bands;
   dates.beforeBands = !options.beforeBands.empty() ? options.beforeBands
                       : !options.bands.empty()     ? options.bands
-                                                   : ValueBands(*dates.before);
+                                                   : examples::ValueBands(*dates.before);
   const std::size_t before = dates.beforeBands.size(), after = dates.afterBands.size();
   if (before == after && after > 0) return;
   const std::string counts = CPLSPrintf("%zu bands are to be compared with %zu of BEFORE", after, before);
@@ -139,10 +130,11 @@ std::vector<int> BandsFor(const std::string& sensor, const std::string& argument
   if (!asked.empty() && asked.size() != needed)
     throw Refusal(option, CPLSPrintf("%zu bands for ", asked.size()) + argument, wanted);
   if (!asked.empty()) return asked;
-  std::vector<int> bands = ValueBands(dataset);
+  std::vector<int> bands = examples::ValueBands(dataset);
   if (needed == 6 && bands.size() == 7) bands.erase(bands.begin() + 5);  // the thermal band
   if (bands.size() != needed)
-    throw Refusal(argument, CPLSPrintf("has %zu bands that are not alpha", ValueBands(dataset).size()),
+    throw Refusal(argument,
+                  CPLSPrintf("has %zu bands that are not alpha", examples::ValueBands(dataset).size()),
                   wanted + ", or " + option + " with their numbers");
   return bands;
 }
@@ -161,16 +153,8 @@ void ChooseSensorBands(const ChangeOptions& options, Dates& dates) {
 
 // The type that holds the real parts of all samples of both dates.
 GDALDataType CommonType(const Dates& dates) {
-  GDALDataType common = GDT_Unknown;
-  const auto add = [&](GDALDataset& dataset, const std::vector<int>& bands) {
-    for (const int band : bands) {
-      const GDALDataType type = GDALGetNonComplexDataType(dataset.GetRasterBand(band)->GetRasterDataType());
-      common = common == GDT_Unknown ? type : GDALDataTypeUnion(common, type);
-    }
-  };
-  add(*dates.before, dates.beforeBands);
-  add(*dates.after, dates.afterBands);
-  return common;
+  return GDALDataTypeUnion(examples::RealTypeOf(*dates.before, dates.beforeBands),
+                           examples::RealTypeOf(*dates.after, dates.afterBands));
 }
 
 // A reader for each date. Both read in one type, as most operators take the reference for one of the image's.
@@ -359,15 +343,10 @@ void RunTasseledCap(const ChangeOptions& options) {
 }
 
 void AddBandOptions(CLI::App& command, ChangeOptions& options, const std::string& byDefault) {
-  const auto add = [&](const char* name, std::vector<int>& bands, const std::string& help) {
-    command.add_option(name, bands, help)
-        ->type_name("N,...")
-        ->delimiter(',')
-        ->expected(1, 1 << 16)
-        ->check(examples::Count(1u << 16));
-  };
-  add("--bands", options.bands, "bands to compare, as in 1,2,3; default: " + byDefault);
-  add("--before-bands", options.beforeBands, "the bands of BEFORE, where they have other numbers");
+  examples::AddBandList(command, "--bands", options.bands,
+                        "bands to compare, as in 1,2,3; default: " + byDefault);
+  examples::AddBandList(command, "--before-bands", options.beforeBands,
+                        "the bands of BEFORE, where they have other numbers");
 }
 
 void AddShowOption(CLI::App& command, ChangeOptions& options) {
@@ -391,17 +370,6 @@ void AddSensorOptions(CLI::App& command, ChangeOptions& options) {
   command.add_option("--before-sensor", options.beforeSensor, "sensor of BEFORE, where it is another one")
       ->type_name("NAME")
       ->check(known);
-}
-
-CLI::Validator SinglePrecision() {
-  const CLI::Validator number = examples::Number();
-  return CLI::Validator(
-      [number](std::string& text) {
-        const std::string wrong = number(text);
-        if (!wrong.empty() || std::abs(std::strtod(text.c_str(), nullptr)) <= FLT_MAX) return wrong;
-        return "'" + text + "' is not usable; expected a number in the range of single precision";
-      },
-      "");
 }
 
 const examples::OutputTypes signedTypes = {
@@ -433,7 +401,7 @@ void AddChangeOptions(CLI::App& command, ChangeOptions& options, const examples:
       ->type_name("V[,V]")
       ->delimiter(',')
       ->expected(1, 2)
-      ->check(SinglePrecision());
+      ->check(examples::SinglePrecision());
 }
 
 // A subcommand, and what it runs.

@@ -1,5 +1,6 @@
 #include "arguments.h"
 
+#include <cfloat>
 #include <cmath>
 #include <cstdio>
 #include <cstdlib>
@@ -40,6 +41,11 @@ CLI::Validator Count(std::uint32_t last) {
 
 CLI::Validator Number() {
   return NumberWith("a finite number", [](double value) { return std::isfinite(value); });
+}
+
+CLI::Validator SinglePrecision() {
+  return NumberWith("a number in the range of single precision",
+                    [](double value) { return std::abs(value) <= FLT_MAX; });
 }
 
 CLI::Validator PositiveNumber() {
@@ -86,20 +92,35 @@ void AddOutputOptions(CLI::App& command, OutputOptions& options, const OutputTyp
 }
 
 void AddJobOptions(CLI::App& command, JobOptions& options, const std::string& notes) {
+  AddJobOptions(command, options,
+                {.names = OutputTypeNames(),
+                 .help = "Byte, UInt16, Int16, UInt32, Int32,\nUInt64, Int64, Float32 (default) or Float64",
+                 .noDataHelp = "nan for floating types, else\n"
+                               "-32768 for Int16 and Int32, 255 for Byte, 65535 for the rest"},
+                notes);
+}
+
+void AddJobOptions(CLI::App& command, JobOptions& options, const OutputTypes& types,
+                   const std::string& notes) {
   command.add_option("INPUT", options.input, "a raster that GDAL reads, of any pixel type")
       ->type_name("FILE")
       ->required();
   AddOutputOptions(
-      command, options,
-      {.names = OutputTypeNames(),
-       .help = "Byte, UInt16, Int16, UInt32, Int32,\nUInt64, Int64, Float32 (default) or Float64",
-       .noDataHelp = "nan for floating types, else\n"
-                     "-32768 for Int16 and Int32, 255 for Byte, 65535 for the rest"},
+      command, options, types,
       notes +
           "\n"
           "No-data: a pixel is left out where a no-data value, a mask band or an alpha band of INPUT\n"
           "says so, and where a sample is NaN. OUTPUT keeps the georeference of INPUT, and appears\n"
           "under its name only when it is complete.\n");
+}
+
+void AddBandList(CLI::App& command, const std::string& name, std::vector<int>& bands,
+                 const std::string& help) {
+  command.add_option(name, bands, help)
+      ->type_name("N,...")
+      ->delimiter(',')
+      ->expected(1, 1 << 16)
+      ->check(Count(1u << 16));
 }
 
 int RunProgram(CLI::App& app, int argc, char** argv, const std::function<void()>& work) {

@@ -24,6 +24,13 @@ void AddOutputOptions(CLI::App& command, OutputOptions& options, const OutputTyp
 
 /// Adds the arguments of `JobOptions` to a command, and `notes` to the end of its help.
 void AddJobOptions(CLI::App& command, JobOptions& options, const std::string& notes);
+/// The same with the pixel types that the command writes.
+void AddJobOptions(CLI::App& command, JobOptions& options, const OutputTypes& types,
+                   const std::string& notes);
+
+/// Adds an option that takes a list of bands. `help` ends with its default.
+void AddBandList(CLI::App& command, const std::string& name, std::vector<int>& bands,
+                 const std::string& help);
 
 /// Refuses anything but a whole number from 1 to `last`.
 CLI::Validator Count(std::uint32_t last);
@@ -33,6 +40,8 @@ CLI::Validator OneOf(const std::vector<std::string>& names);
 
 /// Refuses anything but a finite number.
 CLI::Validator Number();
+/// Refuses anything but a finite number in the range of single precision.
+CLI::Validator SinglePrecision();
 /// Refuses anything but a finite number above 0.
 CLI::Validator PositiveNumber();
 

@@ -85,6 +85,15 @@ DataType TypeOf(GDALDataType type, const std::string& argument) {
                 "integers or floating point numbers");
 }
 
+GDALDataType RealTypeOf(GDALDataset& dataset, const std::vector<int>& bands) {
+  GDALDataType common = GDT_Unknown;
+  for (const int band : bands) {
+    const GDALDataType type = GDALGetNonComplexDataType(dataset.GetRasterBand(band)->GetRasterDataType());
+    common = common == GDT_Unknown ? type : GDALDataTypeUnion(common, type);
+  }
+  return common;
+}
+
 const std::vector<std::string>& OutputTypeNames() {
   static const std::vector<std::string> names = {"Byte",   "UInt16", "Int16",   "UInt32", "Int32",
                                                  "UInt64", "Int64",  "Float32", "Float64"};

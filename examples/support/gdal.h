@@ -28,6 +28,9 @@ DatasetPtr OpenRaster(const std::string& argument, const std::string& path);
 /// The library's type for a band's samples. @throws Refusal naming `argument`
 orvik::tessel::DataType TypeOf(GDALDataType type, const std::string& argument = "INPUT");
 
+/// The type that holds the real parts of all samples of some bands, which count from 1.
+GDALDataType RealTypeOf(GDALDataset& dataset, const std::vector<int>& bands);
+
 /// The GDAL type for `--type`: one of the library's pixel types that GDAL has, none of them complex.
 GDALDataType OutputType(const std::string& name);
 /// True for `Float32` and `Float64`.

@@ -59,7 +59,7 @@ double WriteTiles(const Job& job, OutputRaster& output, const TileWork& work) {
   const auto height = static_cast<std::uint32_t>(job.grid.GetRasterYSize());
   const auto channels = static_cast<std::uint32_t>(job.bands.size());
   const std::vector<Tile> tiles = CutTiles(width, height, job.options.tile);
-  Progress progress(job.bands[job.shown].name, tiles.size());
+  Progress progress(job.name.empty() ? job.bands[job.shown].name : job.name, tiles.size());
   for (const Tile& tile : tiles) {
     Raster out(RasterInfo(tile.width, tile.height, channels, output.Type()), {});
     work(tile, out);
@@ -70,9 +70,56 @@ double WriteTiles(const Job& job, OutputRaster& output, const TileWork& work) {
   return progress.Seconds();
 }
 
+std::vector<Panel> PanelsOf(const Job& job) {
+  std::vector<Panel> panels = {
+      {.band = static_cast<int>(job.shown) + 1, .quantity = job.bands[job.shown], .style = job.style}};
+  panels.insert(panels.end(), job.beside.begin(), job.beside.end());
+  return panels;
+}
+
+// The bands that the panels show, each once.
+std::vector<int> BandsOf(const std::vector<Panel>& panels) {
+  std::vector<int> bands;
+  const auto add = [&](int band) {
+    if (std::find(bands.begin(), bands.end(), band) == bands.end()) bands.push_back(band);
+  };
+  for (const Panel& panel : panels) {
+    if (panel.style.composite.empty()) add(panel.band);
+    for (const CompositeBand& part : panel.style.composite) add(part.band);
+  }
+  return bands;
+}
+
+// A line for the band that is shown, or a line for all and one for each.
+std::string FiguresOf(const Job& job, GDALDataset& written, const std::vector<int>& bands, double seconds) {
+  const std::size_t count = job.bands.size();
+  const std::string size = CPLSPrintf(", %d x %d %s, ", job.grid.GetRasterXSize(), job.grid.GetRasterYSize(),
+                                      job.options.type.c_str());
+  const std::string time = CPLSPrintf("in %.3f s\n", seconds);
+  const auto quantity = [&](int band) { return job.bands[static_cast<std::size_t>(band) - 1]; };
+  const auto figures = [&](int band) {
+    return Describe(Summarise(*written.GetRasterBand(band), quantity(band)), quantity(band));
+  };
+  if (bands.size() == 1) {
+    const int band = bands.front();
+    const std::string place = count > 1 ? CPLSPrintf(" (band %d of %zu)", band, count) : "";
+    return job.options.output + ": " + quantity(band).name + place + size + figures(band) + ", " + time;
+  }
+  std::string text =
+      job.options.output + ": " + job.name + ", " + std::to_string(count) + " bands" + size + time;
+  for (const int band : bands)
+    text += "  band " + std::to_string(band) + ", " + quantity(band).name + ": " + figures(band) + "\n";
+  return text;
+}
+
 }  // namespace
 
 double OutputOptions::NoData() const { return noData.value_or(DefaultNoData(OutputType())); }
+
+std::optional<double> OutputOptions::NoDataIf(bool masked) const {
+  if (noData || IsFloating(OutputType()) || masked) return NoData();
+  return std::nullopt;
+}
 
 DatasetPtr OpenInput(const JobOptions& options) {
   DatasetPtr input = OpenRaster("INPUT", options.input);
@@ -98,6 +145,20 @@ void CheckBand(const std::string& argument, GDALDataset& dataset, int band, cons
       bands == 1 ? "1, as " + input + " has one band" : "a band from 1 to " + std::to_string(bands));
 }
 
+std::vector<int> ValueBands(GDALDataset& dataset) {
+  std::vector<int> bands;
+  for (int band = 1; band <= dataset.GetRasterCount(); ++band)
+    if (dataset.GetRasterBand(band)->GetColorInterpretation() != GCI_AlphaBand) bands.push_back(band);
+  return bands;
+}
+
+std::vector<int> ChosenBands(const std::vector<int>& asked, GDALDataset& input) {
+  for (const int band : asked) CheckBand("--bands", input, band);
+  const std::vector<int> bands = asked.empty() ? ValueBands(input) : asked;
+  if (bands.empty()) throw Refusal("INPUT", "all bands are alpha bands", "a band with values, or --bands");
+  return bands;
+}
+
 std::string DescribeGrid(const std::string& what, GDALDataset& dataset) {
   return what + ": " + CPLSPrintf("%d x %d pixels", dataset.GetRasterXSize(), dataset.GetRasterYSize()) +
          DescribeCells(dataset);
@@ -105,8 +166,6 @@ std::string DescribeGrid(const std::string& what, GDALDataset& dataset) {
 
 void RunJob(const Job& job, const TileWork& work) {
   const OutputOptions& options = job.options;
-  const Quantity& quantity = job.bands[job.shown];
-  const int band = static_cast<int>(job.shown) + 1;
   CheckTileSize(job);
   PendingFile file("OUTPUT", options.output);
   std::optional<PendingFile> picture;
@@ -118,22 +177,19 @@ void RunJob(const Job& job, const TileWork& work) {
   const DatasetPtr written(
       GDALDataset::Open(file.TemporaryPath().c_str(), GDAL_OF_RASTER | GDAL_OF_VERBOSE_ERROR));
   ThrowOnGdalError("reading back '" + options.output + "'", written ? CE_None : CE_Failure);
-  const Summary summary = Summarise(*written->GetRasterBand(band), quantity);
-  if (picture) DrawPicture(*written, band, quantity, job.style, picture->TemporaryPath());
+  const std::vector<Panel> panels = PanelsOf(job);
+  if (picture) DrawPicture(*written, panels, picture->TemporaryPath());
+  const std::string figures = FiguresOf(job, *written, BandsOf(panels), seconds);
   file.Commit();
   if (picture) picture->Commit();
-  std::string name = quantity.name;
-  if (job.bands.size() > 1) name += CPLSPrintf(" (band %d of %zu)", band, job.bands.size());
-  std::printf("%s: %s, %d x %d %s, %s, in %.3f s\n", options.output.c_str(), name.c_str(),
-              job.grid.GetRasterXSize(), job.grid.GetRasterYSize(), options.type.c_str(),
-              Describe(summary, quantity).c_str(), seconds);
+  std::fputs(figures.c_str(), stdout);
 }
 
 void RunJob(const JobOptions& options, GDALDataset& input, const TileReader& reader, const Quantity& quantity,
             PictureStyle style, const TileOperation& operation) {
   const std::filesystem::path path(options.input);
-  style.title =
-      !options.title.empty() ? options.title : Capitalised(quantity.name) + ", " + path.stem().string();
+  const std::string words = Capitalised(style.title.empty() ? quantity.name : style.title);
+  style.title = !options.title.empty() ? options.title : words + ", " + path.stem().string();
   style.caption = DescribeGrid(path.filename().string(), input);
   RunJob({.options = options, .grid = input, .bands = {quantity}, .style = style},
          [&](const Tile& tile, Raster& out) {

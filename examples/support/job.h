@@ -25,6 +25,9 @@ struct OutputOptions {
 
   GDALDataType OutputType() const { return examples::OutputType(type); }
   double NoData() const;  ///< as stated, or the default
+  /// As stated, or NaN for a floating output. Any integer could be a value, so that an output without masked
+  /// pixels has none unless one is stated.
+  std::optional<double> NoDataIf(bool masked) const;
 };
 
 /// What a program with one input is told.
@@ -43,6 +46,13 @@ void CheckOutputs(const OutputOptions& options, const std::vector<GDALDataset*>&
 void CheckBand(const std::string& argument, GDALDataset& dataset, int band,
                const std::string& input = "INPUT");
 
+/// All bands but the alpha bands.
+std::vector<int> ValueBands(GDALDataset& dataset);
+
+/// The bands that were asked for, else `ValueBands`. @throws Refusal for a band that INPUT does not have, or
+/// if there is none
+std::vector<int> ChosenBands(const std::vector<int>& asked, GDALDataset& input);
+
 /// "dem.tif: 83 x 61 pixels, cells of 30 x 25 m"
 std::string DescribeGrid(const std::string& what, GDALDataset& dataset);
 
@@ -53,19 +63,22 @@ struct Job {
   std::vector<Quantity> bands;  ///< of the output, all with the same no-data value
   std::size_t shown = 0;        ///< the band that the figures and the picture are made of
   PictureStyle style = {};
+  std::vector<Panel> beside = {};  ///< more maps of the picture, with figures of their own
+  std::string name = {};           ///< of the bands together; empty: the name of the shown one
 };
 
 /// Fills one tile of the output.
 using TileWork = std::function<void(const Tile& tile, orvik::tessel::Raster& out)>;
 
-/// Does the work for all tiles, writes the GeoTIFF and the picture and prints a line of figures for the
-/// output on standard output. @throws Refusal if a tile of the output is larger than a raster can be
+/// Does the work for all tiles, writes the GeoTIFF and the picture and prints a line of figures for each band
+/// that is shown on standard output. @throws Refusal if a tile of the output is larger than a raster can be
 void RunJob(const Job& job, const TileWork& work);
 
 /// Fills one output tile from one input tile.
 using TileOperation = std::function<void(LoadedTile& in, orvik::tessel::Raster& out)>;
 
-/// The same for one input and one band, with texts of the picture that are made from the input.
+/// The same for one input and one band. The picture's caption is made from the input, and its title from the
+/// one that `options` states, or the style's or the quantity's name and the name of the input.
 void RunJob(const JobOptions& options, GDALDataset& input, const TileReader& reader, const Quantity& quantity,
             PictureStyle style, const TileOperation& operation);
 

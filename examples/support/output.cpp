@@ -1,6 +1,7 @@
 #include "output.h"
 
 #include <cmath>
+#include <cstring>
 #include <limits>
 
 #include "errors.h"
@@ -77,6 +78,18 @@ void CheckStorable(const std::string& argument, double value, GDALDataType type)
                 CPLSPrintf("%.17g does not fit into outputs of type %s", value, GDALGetDataTypeName(type)),
                 IsFloating(type) ? "a value in single precision"
                                  : "a whole number of the type, not negative for 64 bits");
+}
+
+void FillMasked(const orvik::tessel::Mask& mask, double noData, GDALDataType type,
+                orvik::tessel::Raster& out) {
+  const int size = GDALGetDataTypeSizeBytes(type), pixelBytes = size * static_cast<int>(out.channels);
+  std::vector<unsigned char> pixel(static_cast<std::size_t>(pixelBytes));
+  GDALCopyWords(&noData, GDT_Float64, 0, pixel.data(), type, size, static_cast<int>(out.channels));
+  unsigned char* to = out.data;
+  for (std::uint32_t y = 0; y < out.height; ++y)
+    for (std::uint32_t x = 0; x < out.width; ++x, to += pixelBytes)
+      if (!mask.IsValid(static_cast<std::int32_t>(x), static_cast<std::int32_t>(y)))
+        std::memcpy(to, pixel.data(), pixel.size());
 }
 
 OutputRaster::OutputRaster(const PendingFile& file, GDALDataset& source, GDALDataType type,

@@ -4,6 +4,7 @@
 #include <string>
 #include <vector>
 
+#include "basic/tessel/mask/mask.h"
 #include "basic/tessel/raster.h"
 #include "gdal.h"
 #include "pendingfile.h"
@@ -21,6 +22,11 @@ bool IsStorable(double value, GDALDataType type);
 
 /// Refuses a value that is not storable.
 void CheckStorable(const std::string& argument, double value, GDALDataType type);
+
+/// Writes the no-data value of an output of this type into all channels of the pixels whose bit in the mask
+/// is clear.
+void FillMasked(const orvik::tessel::Mask& mask, double noData, GDALDataType type,
+                orvik::tessel::Raster& out);
 
 /// A GeoTIFF with the georeference of its source, written tile by tile.
 class OutputRaster {

@@ -41,6 +41,19 @@ Colour ChangeRamp(double position) {
   return side < 0.0 ? Oklch(lightness, 1.3 * chroma, 0.15) : Oklch(lightness, chroma, 0.58);
 }
 
+Colour PlantRamp(double position) {
+  const double side = 2.0 * position - 1.0;
+  if (side >= 0.0) return GreenRamp(side);
+  const Colour sand = GreenRamp(0.0), water = Oklch(0.42, 0.12, 0.71);
+  const auto mixed = [&](double from, double to) { return from - side * (to - from); };
+  return {mixed(sand.red, water.red), mixed(sand.green, water.green), mixed(sand.blue, water.blue)};
+}
+
+Colour GreenRamp(double position) {
+  const double chroma = 0.03 + 0.11 * std::sin(std::numbers::pi * (0.1 + 0.7 * position)) * position;
+  return Oklch(0.93 - 0.55 * position, chroma, 0.27 + 0.13 * position);
+}
+
 Colour CompassRamp(double position) {
   const double light = std::cos(2.0 * std::numbers::pi * (position - 315.0 / 360.0));
   return Oklch(0.70 + 0.18 * light, 0.105, 0.58 - position);

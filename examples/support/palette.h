@@ -23,6 +23,12 @@ Colour HeatRamp(double position);
 /// could be taken for paper.
 Colour ChangeRamp(double position);
 
+/// From blue over pale sand to dark green: for indices of vegetation around 0, which water is below.
+Colour PlantRamp(double position);
+
+/// From pale sand to dark green, evenly darker: for amounts of vegetation.
+Colour GreenRamp(double position);
+
 /// A closed circle of hues, lightest at the north-west, as maps light their relief: for directions, 0 and 1
 /// being north.
 Colour CompassRamp(double position);

@@ -10,6 +10,7 @@ struct Quantity {
   std::string name;       ///< "slope"
   std::string unit = {};  ///< "degrees"
   bool compass = false;   ///< directions from 0 to 360, which have neither a least nor a greatest one
+  bool bitmap = false;    ///< 1 inside a range and 0 outside
   double scale = 1.0;     ///< the unit's worth of a stored 1
   std::optional<double> flat = {};  ///< the stored value of a cell that has no direction
   std::optional<double> noData =

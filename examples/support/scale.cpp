@@ -52,8 +52,10 @@ double NiceStep(double roughly) {
 
 Scale::Scale(std::vector<double> values, Span span) {
   std::sort(values.begin(), values.end());
-  if (span == Span::change) {
-    SpanChange(values);
+  if (span == Span::percent) {
+    SpanPercent();
+  } else if (span == Span::change || span == Span::bothSigns) {
+    SpanChange(values, span == Span::change ? "+%.6g" : "%.6g");
   } else if (span == Span::factor) {
     SpanFactor(values);
   } else {
@@ -87,14 +89,19 @@ void Scale::SpanValues(const std::vector<double>& values, bool fromZero) {
   for (int i = 0; i <= last; ++i) AddTick(low_ + i * step, "%.6g");
 }
 
-void Scale::SpanChange(const std::vector<double>& values) {
+void Scale::SpanPercent() {
+  high_ = 100.0;
+  for (int i = 0; i <= 100; i += 20) AddTick(i, "%.6g");
+}
+
+void Scale::SpanChange(const std::vector<double>& values, const char* positive) {
   std::vector<double> distances;
   for (const double value : values) distances.push_back(std::abs(value));
   const Limit limit = NiceLimit(CommonDistance(std::move(distances)));
   low_ = -limit.value;
   high_ = limit.value;
   for (int i = -limit.parts; i <= limit.parts; ++i)
-    AddTick(limit.value * i / limit.parts, i > 0 ? "+%.6g" : "%.6g");
+    AddTick(limit.value * i / limit.parts, i > 0 ? positive : "%.6g");
 }
 
 void Scale::SpanFactor(const std::vector<double>& values) {

@@ -7,10 +7,12 @@ namespace examples {
 
 /// How values are laid along a colour ramp.
 enum class Span {
-  values,    ///< from the least to the greatest, without the outermost half percent on both sides
-  fromZero,  ///< from 0 to the greatest, likewise
-  change,    ///< equally far to both sides of 0, so that 98 % of the values are within
-  factor,    ///< by an equal factor to both sides of 1, likewise, in logarithms
+  values,     ///< from the least to the greatest, without the outermost half percent on both sides
+  fromZero,   ///< from 0 to the greatest, likewise
+  percent,    ///< from 0 to 100
+  bothSigns,  ///< equally far to both sides of 0, so that 98 % of the values are within
+  change,     ///< likewise, with the signs of increase and decrease
+  factor,     ///< by an equal factor to both sides of 1, likewise, in logarithms
 };
 
 /// What the ramp spans, rounded outwards to numbers that read well.
@@ -31,7 +33,8 @@ class Scale {
 
  private:
   void SpanValues(const std::vector<double>& values, bool fromZero);
-  void SpanChange(const std::vector<double>& values);
+  void SpanPercent();
+  void SpanChange(const std::vector<double>& values, const char* positive);
   void SpanFactor(const std::vector<double>& values);
   void AddTick(double value, const char* format);
   void MarkValuesBeyond(double least, double greatest);

@@ -64,6 +64,7 @@ std::string Describe(const Summary& summary, const Quantity& quantity) {
       CPLSPrintf("%llu of %llu pixels valid", static_cast<unsigned long long>(summary.valid),
                  static_cast<unsigned long long>(summary.pixels));
   if (summary.valid == summary.flat) return "no values, " + counts;
+  if (quantity.bitmap) return CPLSPrintf("%.2f %% inside, ", 100.0 * summary.mean) + counts;
   std::string text = CPLSPrintf("min %.2f, %s %.2f, max %.2f", summary.min,
                                 quantity.compass ? "mean direction" : "mean", summary.mean, summary.max);
   if (!quantity.unit.empty()) text += " " + quantity.unit;

@@ -50,6 +50,9 @@ class TileReader {
 
   orvik::tessel::DataType Type() const { return dataType_; }
 
+  std::size_t Channels() const { return source_.bands.size(); }
+  int Band(std::size_t channel) const { return source_.bands[channel]; }
+
   /// True if a pixel may be invalid.
   bool Masked() const { return masked_; }
 

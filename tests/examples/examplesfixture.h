@@ -109,17 +109,17 @@ class ExamplesFixture : public testing::Test {
     return DatasetPtr(GDALDataset::Open(Path(name).c_str(), GDAL_OF_RASTER));
   }
 
-  // The samples of the first band as they are stored.
+  // The samples of all bands as they are stored.
   std::vector<unsigned char> Bits(const std::string& name) const {
     const DatasetPtr dataset = Open(name);
     if (!dataset) return {};
-    GDALRasterBand& band = *dataset->GetRasterBand(1);
-    const int width = band.GetXSize(), height = band.GetYSize();
-    const int size = GDALGetDataTypeSizeBytes(band.GetRasterDataType());
+    const GDALDataType type = dataset->GetRasterBand(1)->GetRasterDataType();
+    const int width = dataset->GetRasterXSize(), height = dataset->GetRasterYSize();
+    const int bands = dataset->GetRasterCount(), size = GDALGetDataTypeSizeBytes(type);
     std::vector<unsigned char> bits(static_cast<std::size_t>(width) *
-                                    static_cast<std::size_t>(height * size));
-    EXPECT_EQ(band.RasterIO(GF_Read, 0, 0, width, height, bits.data(), width, height,
-                            band.GetRasterDataType(), 0, 0, nullptr),
+                                    static_cast<std::size_t>(height * size * bands));
+    EXPECT_EQ(dataset->RasterIO(GF_Read, 0, 0, width, height, bits.data(), width, height, type, bands,
+                                nullptr, 0, 0, 0, nullptr),
               CE_None);
     return bits;
   }
@@ -134,6 +134,11 @@ class ExamplesFixture : public testing::Test {
         band.RasterIO(GF_Read, 0, 0, width, height, values.data(), width, height, GDT_Float64, 0, 0, nullptr),
         CE_None);
     return values;
+  }
+
+  void ExpectDone(const std::string& program, const std::string& arguments) const {
+    const Outcome outcome = Run(program, arguments);
+    ASSERT_EQ(outcome.status, 0) << arguments << "\n" << outcome.errors;
   }
 
   // What is in the folder for outputs, hidden files included.
