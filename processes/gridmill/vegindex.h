@@ -84,6 +84,8 @@ class GRIDMILL_EXPORT VegIndexParams {
 /// - 11, MTVI1: 1.2 (1.2 (N - G) - 2.5 (R - G)). Haboudane et al. (2004), Remote Sensing of Environment
 ///   90(3).
 ///
+/// MSAVI2 lies 0.5 above its form in the literature, which begins with 2 N + 1.
+///
 /// Parameters: both vectors empty by default; `Process` reads twelve entries of the requests and one role for
 /// each input channel. A setter called after `Process` takes effect when a type changes. Failures:
 /// `Exception` "Invalid type requested." if the type of the input or the output is none of the ten, a complex
