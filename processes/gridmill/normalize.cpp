@@ -26,45 +26,43 @@ constexpr std::size_t kSamples = 1024;
 
 // ---- pixel
 
-/// How the hundredfold distance from the lower bound becomes a percentage.
+/// How the distance from the lower bound becomes a percentage.
 enum class Scaling {
-  kDivide,    ///< by the range
-  kMultiply,  ///< by its reciprocal
+  kDivide,    ///< times 100, by the range
+  kMultiply,  ///< times the gain, 100 / range
 };
 
-/// A percentage within the range. `scale` is the range or its reciprocal.
+/// A percentage within the range. `scale` is the range or the gain.
 template <Scaling scaling>
 GRIDMILL_INLINE float QuotientOf(float value, float low, double scale) {
-  const double hundredfold = static_cast<double>(value - low) * 100.0;
-  return static_cast<float>(scaling == Scaling::kDivide ? hundredfold / scale : hundredfold * scale);
+  const double distance = value - low;
+  return static_cast<float>(scaling == Scaling::kDivide ? distance * 100.0 / scale : distance * scale);
 }
 
-/// A sample as it is written, from its percentage within the range.
+/// A sample as it is written, from its percentage within the range. This needs no limits: below the upper
+/// bound the distance, rounded, is at most the range, rounded.
 GRIDMILL_INLINE float PercentOf(float value, float quotient, float low, float high, float noData) {
-  const float positive = quotient < 0.0f ? 0.0f : quotient;
-  const float limited = positive >= 100.0f ? 100.0f : positive;
-  const float below = value >= high ? 100.0f : limited;
+  const float below = value >= high ? 100.0f : quotient;
   const float percent = low >= value ? 0.0f : below;
   return kernels::IsNoData(value, noData) ? noData : percent;
 }
 
-/// True if products with the reciprocal of a range, narrowed to `float`, are the bits of the quotients.
+/// True if products with the gain, narrowed to `float`, are the bits of the quotients.
 ///
 /// Product and quotient in `double` differ by less than 2^-51 of the quotient, in relation to it. The
 /// dividend has 31 bits and the range 24: a quotient that is not half way between two floats is further than
 /// 2^-49 from there, so that both go to the same float. One that is half way, with 25 bits, times the odd
 /// part of the range makes a dividend of 31 bits: this odd part is below 128. The product is half way too if
-/// the error of the reciprocal is below 2^-54.
-bool ReciprocalServes(float range) {
+/// the error of the gain is below 2^-54.
+bool GainServes(float range) {
   int exponent = 0;
-  auto significand = static_cast<std::uint32_t>(std::ldexp(std::frexp(std::fabs(range), &exponent), 24));
-  if (!std::isfinite(range) || significand == 0) return false;
-  while (significand % 2 == 0) significand /= 2;
-  const double odd = significand;
-  return significand >= 128 || std::fabs(std::fma(1.0 / odd, odd, -1.0)) < 0x1p-54;
+  auto odd = static_cast<std::uint32_t>(std::ldexp(std::frexp(std::fabs(range), &exponent), 24));
+  if (!std::isfinite(range) || odd == 0) return false;
+  while (odd % 2 == 0) odd /= 2;
+  return odd >= 128 || std::fabs(std::fma(100.0 / odd, odd, -100.0)) < 100 * 0x1p-54;
 }
 
-/// Floats below have fewer bits, for which a reciprocal does not serve.
+/// Floats below have fewer bits, for which a gain does not serve.
 constexpr float kLeastProduct = 2.0f * std::numeric_limits<float>::min();
 
 // ---- row
@@ -74,12 +72,12 @@ struct Ranges {
   const float* low;
   const float* high;
   const double* range;
-  const double* reciprocal;
+  const double* gain;
 };
 
 GRIDMILL_MULTIVERSION void DividedRow(const float* value, const Ranges& ranges, float noData,
                                       std::size_t count, float* __restrict percent) {
-  const auto [low, high, range, reciprocal] = ranges;
+  const auto [low, high, range, gain] = ranges;
   for (std::size_t i = 0; i < count; ++i) {
     const float quotient = QuotientOf<Scaling::kDivide>(value[i], low[i], range[i]);
     percent[i] = PercentOf(value[i], quotient, low[i], high[i], noData);
@@ -89,10 +87,10 @@ GRIDMILL_MULTIVERSION void DividedRow(const float* value, const Ranges& ranges, 
 /// Returns false if a product is too small to be the quotient.
 GRIDMILL_MULTIVERSION bool MultipliedRow(const float* value, const Ranges& ranges, float noData,
                                          std::size_t count, float* __restrict percent) {
-  const auto [low, high, range, reciprocal] = ranges;
+  const auto [low, high, range, gain] = ranges;
   int small = 0;
   for (std::size_t i = 0; i < count; ++i) {
-    const float quotient = QuotientOf<Scaling::kMultiply>(value[i], low[i], reciprocal[i]);
+    const float quotient = QuotientOf<Scaling::kMultiply>(value[i], low[i], gain[i]);
     small |= static_cast<int>(quotient < kLeastProduct) & static_cast<int>(value[i] > low[i]);
     percent[i] = PercentOf(value[i], quotient, low[i], high[i], noData);
   }
@@ -101,7 +99,7 @@ GRIDMILL_MULTIVERSION bool MultipliedRow(const float* value, const Ranges& range
 
 /// The percentages in a row that is not the samples'.
 void PercentRow(const float* value, const Ranges& ranges, float noData, std::size_t count, float* percent) {
-  if (ranges.reciprocal == nullptr || !MultipliedRow(value, ranges, noData, count, percent))
+  if (ranges.gain == nullptr || !MultipliedRow(value, ranges, noData, count, percent))
     DividedRow(value, ranges, noData, count, percent);
 }
 
@@ -124,7 +122,7 @@ void WritePercentRow(const In* source, const Ranges& ranges, float noData, std::
 struct Pattern {
   std::size_t pixels;  ///< of a block
   std::vector<float> low, high;
-  std::vector<double> range, reciprocal;
+  std::vector<double> range, gain;
   bool multiplies = true;
 
   Pattern(const details::NormalizeParams& of, std::size_t channels)
@@ -132,18 +130,18 @@ struct Pattern {
     for (std::size_t c = 0; c < channels; ++c) {
       const float difference = of.MaxData[c] - of.MinData[c];
       range.push_back(difference);
-      reciprocal.push_back(1.0 / difference);
-      multiplies = multiplies && ReciprocalServes(difference);
+      gain.push_back(100.0 / difference);
+      multiplies = multiplies && GainServes(difference);
     }
     low = kernels::ChannelPattern(of.MinData, channels, pixels);
     high = kernels::ChannelPattern(of.MaxData, channels, pixels);
     range = kernels::ChannelPattern(range, channels, pixels);
-    reciprocal = kernels::ChannelPattern(reciprocal, channels, pixels);
+    gain = kernels::ChannelPattern(gain, channels, pixels);
   }
 
   Ranges From(std::size_t sample) const {
     return {low.data() + sample, high.data() + sample, range.data() + sample,
-            multiplies ? reciprocal.data() + sample : nullptr};
+            multiplies ? gain.data() + sample : nullptr};
   }
 };
 
