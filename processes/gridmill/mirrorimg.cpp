@@ -40,7 +40,7 @@ inline constexpr bool kKeeps = std::is_same_v<In, Out> &&
 template <class In, class Out>
 void TransferSamples(const In* source, std::size_t count, Out* target) {
   if constexpr (kKeeps<In, Out>) {
-    std::memcpy(target, source, count * sizeof(In));
+    if (count > 0) std::memcpy(target, source, count * sizeof(In));
   } else {
     float scratch[kBlock];
     for (std::size_t i = 0; i < count; i += kBlock) {

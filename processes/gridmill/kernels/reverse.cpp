@@ -9,13 +9,15 @@ namespace orvik::kernels {
 
 namespace {
 
-/// Pixels that are words.
+/// Pixels of the size of a word, wherever they lie.
 template <class Word>
 GRIDMILL_MULTIVERSION void ReverseWords(const unsigned char* __restrict first, std::size_t count,
                                         unsigned char* __restrict target) {
-  const auto* const source = reinterpret_cast<const Word*>(first);
-  auto* const words = reinterpret_cast<Word*>(target);
-  for (std::size_t i = 0; i < count; ++i) words[i] = source[count - 1 - i];
+  for (std::size_t i = 0; i < count; ++i) {
+    Word word;
+    std::memcpy(&word, first + (count - 1 - i) * sizeof(Word), sizeof(Word));
+    std::memcpy(target + i * sizeof(Word), &word, sizeof(Word));
+  }
 }
 
 /// Pixels of any size that is known to the compiler.
@@ -29,7 +31,7 @@ void ReverseSized(const unsigned char* last, std::size_t count, unsigned char* t
 
 void ReversePixels(const unsigned char* last, std::size_t pixelBytes, std::size_t pixels,
                    unsigned char* target) {
-  if (pixels == 0) return;
+  if (pixels == 0 || pixelBytes == 0) return;
   const unsigned char* const first = last - static_cast<std::ptrdiff_t>((pixels - 1) * pixelBytes);
   switch (pixelBytes) {
     case 1:

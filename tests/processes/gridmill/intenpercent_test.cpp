@@ -109,6 +109,18 @@ TEST(IntenPercent, CubicIsEvaluatedInsideABin) {
   EXPECT_EQ(Percent<double>(percent, 0.25f), 1.85546875);
 }
 
+TEST(IntenPercent, SplineIsAddedUpInItsOwnOrder) {
+  // 74.999999999999986 and 99.999999999999986, by Horner's rule 75 and 100
+  IntenPercent quarters = UnitBins({4, 2, 3});
+  quarters.SetMax(12.0);
+  quarters.SetScale(0.25);
+  EXPECT_EQ((Percent<float, int>(quarters, 9)), 74.0f);
+  IntenPercent twentieths = UnitBins({5, 1, 0});
+  twentieths.SetMax(60.0);
+  twentieths.SetScale(static_cast<double>(0.05f));
+  EXPECT_EQ((Percent<float, int>(twentieths, 59)), 99.0f);
+}
+
 TEST(IntenPercent, IntensityOnABinEdgeGivesTheCumulativePercentage) {
   const IntenPercent percent = UnitBins({4, 2, 1, 1});
   EXPECT_EQ(Percent(percent, 1.0f), 50.0f);
@@ -161,6 +173,14 @@ TEST(IntenPercent, MinimumAtOrAboveTheMaximumGives0UpToItAnd100Beyond) {
   }
 }
 
+TEST(IntenPercent, MaximumWithinTheBinsGives100) {
+  IntenPercent percent = UnitBins({1, 1, 1, 1});
+  percent.SetMax(2.0);
+  EXPECT_EQ(Percent(percent, 1.0f), 25.0f);
+  EXPECT_EQ(Percent(percent, 2.0f), 100.0f);
+  EXPECT_EQ(Percent(percent, 3.0f), 100.0f);
+}
+
 TEST(IntenPercent, BinBeyondTheLastGives100AndANegativeBin0) {
   IntenPercent wide = UnitBins({1, 3});
   wide.SetMax(10.0);
@@ -170,6 +190,10 @@ TEST(IntenPercent, BinBeyondTheLastGives100AndANegativeBin0) {
   reversed.SetScale(-1.0);
   EXPECT_EQ(Percent(reversed, 0.5f), 0.0f);
   EXPECT_EQ(Percent(reversed, 1.5f), 0.0f);
+  IntenPercent empty = UnitBins({});
+  empty.SetMax(4.0);
+  empty.SetScale(-1.0);
+  EXPECT_EQ(Percent(empty, 1.0f), 0.0f);
 }
 
 TEST(IntenPercent, BinThatLeaves32BitsIsNegative) {
@@ -204,6 +228,9 @@ TEST(IntenPercent, RangeAndScaleAreDouble) {
   percent = UnitBins({1, 1});
   percent.SetMin(0.7);  // above that of 0.7
   EXPECT_EQ(Percent(percent, 0.7f), 0.0f);
+  percent = UnitBins({1, 1});
+  percent.SetMin(0.1);
+  EXPECT_GT(Percent(percent, 0.1f), 0.0f);
   percent = UnitBins({1, 3});
   percent.SetMin(16777217.0);
   percent.SetMax(16777219.0);
@@ -336,6 +363,19 @@ TEST(IntenPercent, ExcludedPixelHoldsNoDataCastToTheInputsTypeInAllFourSamples) 
   EXPECT_EQ((Percents<int, int>(percent, {5, 9, 1}, false)),
             std::vector<int>(4, std::numeric_limits<int>::min()));
   EXPECT_EQ((Percents<int, unsigned char>(percent, {5, 9, 1}, false)), std::vector<int>(4, 0));
+}
+
+TEST(IntenPercent, ExcludedPixelOfANegativeZeroKeepsItsSignOnlyInAFloatingInput) {
+  const auto isNegative = []<class In>(double noData, In sample) {
+    IntenPercent percent = UnitBins({1, 3});
+    percent.SetNoData(noData);
+    return std::signbit(Percents<double, In>(percent, {sample, sample, sample}, false)[3]);
+  };
+  EXPECT_FALSE(isNegative(-0.25, short{1}));
+  EXPECT_FALSE(isNegative(-0.0, 1));
+  EXPECT_FALSE(isNegative(-0.25, std::int64_t{1}));
+  EXPECT_TRUE(isNegative(-0.0, 1.0f));
+  EXPECT_TRUE(isNegative(-0.0, 1.0));
 }
 
 TEST(IntenPercent, ForwardReversesTheSignWhereTheSecondValueIsAboveTheFirst) {

@@ -89,6 +89,12 @@ TEST(Percentile, CubicIsEvaluatedInsideABin) {
   EXPECT_EQ(PercentileOf<double>(percentile, 0.25f), 1.85546875);
 }
 
+TEST(Percentile, SplineIsAddedUpInItsOwnOrder) {
+  // 74.999999999999986 and 99.999999999999986, by Horner's rule 75 and 100
+  EXPECT_EQ((PercentileOf<float, int>(OneChannel({4, 2, 3}, 0.0f, 12.0f), 9)), 74.0f);
+  EXPECT_EQ((PercentileOf<float, int>(OneChannel({5, 1, 0}, 0.0f, 60.0f), 59)), 99.0f);
+}
+
 TEST(Percentile, SampleOnABinEdgeGivesTheCumulativePercentage) {
   const Percentile percentile = UnitBins({4, 2, 1, 1});
   EXPECT_EQ(PercentileOf(percentile, 1.0f), 50.0f);
