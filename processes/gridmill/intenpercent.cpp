@@ -2,7 +2,6 @@
 
 #include <algorithm>
 #include <cstddef>
-#include <cstdint>
 #include <cstdlib>
 #include <new>
 #include <type_traits>
@@ -179,9 +178,6 @@ Value* Zeros(int count) {
   return static_cast<Value*>(block);
 }
 
-/// Deliberate: sums and products of counts wrap in 32 bits.
-int Wrap(std::uint32_t bits) { return static_cast<int>(bits); }
-
 }  // namespace
 
 // ---- operator
@@ -192,12 +188,10 @@ void details::IntenPercentParams::SetCoefficients() {
   spareBlock = Zeros<int>(binCount + 2);
   for (double** const block : {&cumulative, &alpha, &linear, &quadratic, &cubic, &diagonal, &mu, &z})
     *block = Zeros<double>(binCount + 2);
-  std::uint32_t sum = 0;
-  for (const int count : Bins) sum += static_cast<std::uint32_t>(count);
-  total = Wrap(sum);
+  total = kernels::SumOfCounts(Bins.data(), Bins.size());
   cumulative[binCount + 1] = 100.0;
   for (int i = 1; i <= binCount; ++i) {
-    const double percent = Wrap(static_cast<std::uint32_t>(Bins[static_cast<std::size_t>(i - 1)]) * 100u);
+    const double percent = kernels::Hundredfold(Bins[static_cast<std::size_t>(i - 1)]);
     cumulative[i] = percent / total + cumulative[i - 1];
   }
   kernels::SolveSpline({cumulative, alpha, linear, quadratic, cubic, diagonal, mu, z}, binCount, Scale);

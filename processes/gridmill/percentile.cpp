@@ -181,9 +181,6 @@ struct PercentileFrame : frame::Defaults<details::PercentileParams> {
   }
 };
 
-/// Deliberate: sums and products of counts wrap in 32 bits.
-int Wrap(std::uint32_t bits) { return static_cast<int>(bits); }
-
 }  // namespace
 
 // ---- operator
@@ -198,13 +195,11 @@ void details::PercentileParams::SetCoefficients(std::vector<int> counts) {
   binScale.resize(channels);
   for (std::size_t c = 0; c < channels; ++c) {
     const int* const count = Coefficients.data() + bins * c;
-    std::uint32_t total = 0;
-    for (std::size_t i = 0; i < bins; ++i) total += static_cast<std::uint32_t>(count[i]);
-    totals[c] = Wrap(total);
+    totals[c] = kernels::SumOfCounts(count, bins);
     binScale[c] = static_cast<float>(BinNum) / (MaxData[c] - MinData[c]);
     cumulative[c][bins + 1] = 100.0;
     for (std::size_t i = 1; i <= bins; ++i) {
-      const double percent = Wrap(static_cast<std::uint32_t>(count[i - 1]) * 100u);
+      const double percent = kernels::Hundredfold(count[i - 1]);
       cumulative[c][i] = totals[c] != 0 ? percent / totals[c] + cumulative[c][i - 1] : 0.0;
     }
     kernels::SolveSpline({cumulative[c].data(), alpha[c].data(), linear[c].data(), quadratic[c].data(),

@@ -62,7 +62,7 @@ struct Plan {
 template <class In>
 inline constexpr bool kNarrow = std::is_integral_v<In> && sizeof(In) <= 2;
 
-/// The bands of a block after the other.
+/// Loads the bands of one block after the other.
 template <class In>
 class BandLoader {
  public:
@@ -159,13 +159,14 @@ bool WriteFromPixels(const Plan& plan, const tessel::Raster& in, const tessel::M
     const std::size_t code = plan.codes.front();
     if (in.channels != 4 || plan.codes.size() != 1 || !kernels::HasPixelRow(code) || plan.LacksBand())
       return false;
-    const auto& at = plan.channels;
+    const auto at = [&plan](std::size_t role) { return plan.IsRead(role) ? plan.channels[role] : 0; };
+    const kernels::NarrowPixelBands bands{at(eBAND_GREEN), at(eBAND_RED), at(eBAND_NIR)};
     const bool far = in.dataSize > kCachedBytes;
-    const frame::FilterShape shape{.pixels = frame::kMaxBlock};
+    const frame::FilterShape shape{.pixels = 2 * kBlock};
     frame::FilterRows<In, Out>(in, mask, out, shape, [&](const auto& block) {
       if (WriteExcluded(block, 1)) return;
       if (far) kernels::PrefetchAhead(block.image, block.pixels * block.stride);
-      kernels::NarrowPixelRow(code, block.image, {at[1], at[2], at[4]}, block.pixels, block.target);
+      kernels::NarrowPixelRow(code, block.image, bands, block.pixels, block.target);
       if (block.masked) ExcludePixels(block.valid, 1, block.pixels, block.target);
     });
     return true;
@@ -185,7 +186,7 @@ class VegIndex::InnerProcessor : public IProcessor, public details::VegIndexPara
 
     BandLoader<In> loader(plan);
     const bool far = in->dataSize > kCachedBytes;
-    const frame::FilterShape shape{.pixels = 64, .outSamples = plan.codes.size()};
+    const frame::FilterShape shape{.pixels = kBlock, .outSamples = plan.codes.size()};
     frame::FilterRows<In, Out>(*in, mask, *out, shape, [&](const auto& block) {
       if (WriteExcluded(block, plan.codes.size())) return;
       if (far) kernels::PrefetchAhead(block.image, block.pixels * block.stride);

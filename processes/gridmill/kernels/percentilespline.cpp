@@ -1,10 +1,19 @@
 #include "processes/gridmill/kernels/percentilespline.h"
 
+#include <cstdint>
 #include <cstring>
 
 #include "processes/gridmill/kernels/multiversion.h"
 
 namespace orvik::kernels {
+
+int SumOfCounts(const int* counts, std::size_t bins) {
+  std::uint32_t sum = 0;
+  for (std::size_t i = 0; i < bins; ++i) sum += static_cast<std::uint32_t>(counts[i]);
+  return static_cast<int>(sum);
+}
+
+int Hundredfold(int count) { return static_cast<int>(static_cast<std::uint32_t>(count) * 100u); }
 
 void SolveSpline(const SplineTables& tables, int bins, double scale) {
   const auto [cumulative, alpha, linear, quadratic, cubic, diagonal, mu, z] = tables;

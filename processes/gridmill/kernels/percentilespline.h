@@ -8,6 +8,10 @@
 /// The cubic spline through cumulative percentages at the edges of equal bins.
 namespace orvik::kernels {
 
+/// Deliberate: counts are added, and multiplied by 100, in 32 bits that wrap.
+int SumOfCounts(const int* counts, std::size_t bins);
+int Hundredfold(int count);
+
 /// The tables of a spline, with an entry for each bin and two more. `cumulative` is given.
 struct SplineTables {
   const double* cumulative;

@@ -8,6 +8,7 @@
 #include <cstring>
 #include <string_view>
 
+#include "processes/gridmill/kernels/exactquotient.h"
 #include "processes/gridmill/kernels/multiversion.h"
 
 namespace orvik::kernels {
@@ -119,8 +120,9 @@ struct Mtvi1 {
   }
 };
 
-// Narrow integers are those of at most 16 bits, signed or not. Their sums and differences are exact in
-// `float`, as are those of the few terms with small factors below.
+// Bands that are narrow integers. Their sums and differences, and those times 3 or 2, are exact in `float`. A
+// quotient of such lies no closer than 2^-43 to the middle between two `float`s and is never it, so that it
+// rounds to the same `float` with a `double` in between, or from anything within 2^-44.
 
 /// Three times the numerator over twice the divisor, which is odd: never 0.
 struct NarrowSavi {
@@ -128,28 +130,6 @@ struct NarrowSavi {
     return LimitedToOne(((p.N - p.R) * 3.0f) / ((p.N + p.R) * 2.0f + 1.0f));
   }
 };
-
-/// What is divided by: halves of integers below 2^18.
-struct Divisor {
-  double value;
-  double reciprocal;  ///< within 2^-47 of itself
-
-  /// One step of Newton's from the reciprocal in `float`, whose product with the divisor is exact.
-  explicit GRIDMILL_INLINE Divisor(float divisor) : value(divisor) {
-    const double y = 1.0f / divisor;
-    reciprocal = y + y * (1.0 - value * y);
-  }
-};
-
-/// The quotient with an integer below 2^36 or the half of one, correctly rounded. The upper 32 bits of an
-/// estimate leave a remainder that is exact; its quotient is added. What is rounded then lies within 2^-77 of
-/// the true quotient, and that is no closer than 2^-72 to the middle between two numbers without being it.
-GRIDMILL_INLINE double ExactQuotient(double numerator, const Divisor& divisor) {
-  constexpr std::int64_t kUpper = -(std::int64_t{1} << 21);
-  const double estimate = numerator * divisor.reciprocal;
-  const double upper = std::bit_cast<double>(std::bit_cast<std::int64_t>(estimate) & kUpper);
-  return upper + (numerator - upper * divisor.value) * divisor.reciprocal;
-}
 
 // ---- row
 

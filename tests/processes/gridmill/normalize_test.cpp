@@ -429,14 +429,15 @@ TEST_P(NormalizeDifferential, AgreesWithTheTwinBitForBit) {
   return ::testing::AssertionSuccess();
 }
 
-TEST_P(NormalizeDifferential, AgreesWithTheTwinOnAllValuesOf16BitsOrFewer) {
+/// The types of at most 16 bits.
+struct NormalizeOfNarrowSamples : ::testing::TestWithParam<PixelType> {};
+
+TEST_P(NormalizeOfNarrowSamples, AgreesWithTheTwinOnAllValues) {
   constexpr Bounds kBounds[] = {{0, 127},      {-128, 127}, {0, 255},       {5, 8},        {-3, 4},
                                 {-50, 50},     {0, 65535},  {-32768, 0},    {100, 1100},   {0.5f, 40000.25f},
                                 {0, 0.00001f}, {7, -7},     {-1e30f, 1e6f}, {-1e-3f, 3e4f}};
-  const PixelType& type = GetParam();
-  if (DataType(type.element).sizeBits > 16) GTEST_SKIP() << "too many values";
   tests::Random random(20240412);
-  tests::WithPixelType(type.element, [&]<class T>() {
+  tests::WithPixelType(GetParam().element, [&]<class T>() {
     Image<T> in({512, 129});  // one row more than the values
     for (std::size_t i = 0; i < in.dataSize / sizeof(T); ++i) in.Elements()[i] = static_cast<T>(i);
     for (int i = 0; i < 3; ++i) {
@@ -446,6 +447,41 @@ TEST_P(NormalizeDifferential, AgreesWithTheTwinOnAllValuesOf16BitsOrFewer) {
           << bounds.low << " to " << bounds.high;
     }
   });
+}
+
+/// A raster of one row with `draw()` for each sample.
+template <class T, class Draw>
+std::unique_ptr<Image<T>> RowOf(std::uint32_t width, Draw draw) {
+  auto row = std::make_unique<Image<T>>(tests::Size{width, 1});
+  std::generate_n(row->Elements(), width, [&] { return static_cast<T>(draw()); });
+  return row;
+}
+
+TEST(NormalizeQuotients, AgreeWithTheTwinsHalfWayBetweenFloats) {
+  tests::Random random(20240415);
+  for (std::uint32_t odd = 1; odd < 64; odd += 2) {
+    for (const int power : {24, 0, -20, 60}) {
+      // 100 times an odd number of 20 bits or a little more is, over a power of two, one of 25 bits
+      const auto row = RowOf<float>(1000, [&] {
+        const std::uint32_t multiple = std::min(671089 + random.Below(671089), (1u << 24) / odd) | 1;
+        return std::ldexp(static_cast<double>(odd * multiple), power - 24);
+      });
+      const float max = std::ldexp(static_cast<float>(odd), power);
+      EXPECT_TRUE(AgreesForAllOutputs(RangeOf({0}, {max}, -1), *row)) << max;
+    }
+  }
+}
+
+TEST(NormalizeQuotients, AgreeWithTheTwinsHalfWayBetweenDenormals) {
+  tests::Random random(20240416);
+  for (std::uint32_t odd = 1; odd < 400; odd += 2) {
+    const auto row = RowOf<float>(500, [&] {
+      const std::uint32_t multiple = random.Below(random.OneIn(2) ? 16 : 30000);
+      return std::ldexp(static_cast<double>(odd * multiple), -150 + 60);
+    });
+    const float max = std::ldexp(100.0f * static_cast<float>(odd), 60);
+    EXPECT_TRUE(AgreesForAllOutputs(RangeOf({0}, {max}, -1), *row)) << max;
+  }
 }
 
 TEST_P(NormalizeDifferential, AgreesWithTheTwinWhereInputAndOutputAreOneRaster) {
@@ -464,6 +500,9 @@ TEST_P(NormalizeDifferential, AgreesWithTheTwinWhereInputAndOutputAreOneRaster) 
 }
 
 INSTANTIATE_TEST_SUITE_P(From, NormalizeDifferential, ::testing::ValuesIn(tests::kPixelTypes),
+                         ::testing::PrintToStringParamName());
+INSTANTIATE_TEST_SUITE_P(From, NormalizeOfNarrowSamples,
+                         ::testing::ValuesIn(tests::kPixelTypes.begin(), tests::kPixelTypes.begin() + 4),
                          ::testing::PrintToStringParamName());
 
 // ---- contract

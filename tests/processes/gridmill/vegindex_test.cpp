@@ -582,10 +582,11 @@ TEST_P(VegIndexDifferential, AgreesWithTheTwinOnAllCombinationsOfAFewValues) {
   });
 }
 
-TEST_P(VegIndexDifferential, AgreesWithTheTwinOnAllPairsOfRedAndNearInfraredOf8Bits) {
-  const PixelType& type = GetParam();
-  if (DataType(type.element).sizeBits > 16) GTEST_SKIP() << "tested with other values";
-  tests::WithPixelType(type.element, [&]<class T>() {
+/// The types of at most 16 bits.
+struct VegIndexOfNarrowSamples : ::testing::TestWithParam<PixelType> {};
+
+TEST_P(VegIndexOfNarrowSamples, AgreesWithTheTwinOnPairsOfRedAndNearInfraredOverTheWholeRange) {
+  tests::WithPixelType(GetParam().element, [&]<class T>() {
     Image<T> in({256, 256, 3});
     in.Set([](int x, int y, std::uint32_t c) {
       const int far = sizeof(T) == 1 ? 1 : 251;  // over the whole range of 16 bits
@@ -593,6 +594,49 @@ TEST_P(VegIndexDifferential, AgreesWithTheTwinOnAllPairsOfRedAndNearInfraredOf8B
     });
     EXPECT_TRUE(AgreesForAllOutputs({eBAND_RED, eBAND_NIR, eBAND_GREEN}, in));
   });
+}
+
+TEST_P(VegIndexDifferential, AgreesWithTheTwinOnManyRandomPixelsOfSevenBands) {
+  tests::Random random(20240503);
+  for (const tests::Fill fill : {tests::Fill::eBITS, tests::Fill::eMIXED}) {
+    Raster in({5000, 4, kRoles, GetParam().element}, {});
+    tests::FillRandom(in, fill, random, kExtra);
+    EXPECT_TRUE(AgreesForAllOutputs(kEachRoleOnce, in));
+  }
+}
+
+/// Compares operator and twin on one index of pixels of four channels.
+::testing::AssertionResult AgreesOnPixelsOfFourChannels(tests::Random& random, const DataType& in,
+                                                        const DataType& out, unsigned int code) {
+  constexpr std::uint32_t kWidths[] = {1, 7, 63, 64, 257, 300, 2049};
+  tests::Case c;
+  c.in = in;
+  c.out = out;
+  c.size = {random.Pick(kWidths), 1 + random.Below(2), 4};
+  c.inMargins = {random.Below(2), random.Below(2)};
+  c.maskKind = random.OneIn(2) ? tests::MaskKind::eNULL : random.Pick(tests::kMaskKinds);
+  c.fill = random.OneIn(2) ? tests::Fill::eBITS : random.Pick(tests::kFills);
+  c.seed = random.Bits();
+  Codes roles = random.OneIn(3) ? DrawRoles(random, 4) : Codes{eBAND_RED, eBAND_GREEN, eBAND_NIR, 9};
+  std::swap(roles[0], roles[random.Below(4)]);
+  const VegIndex index = OperatorOf(RequestsOf({code}), roles);
+  ::testing::AssertionResult result = Agree(
+      c, kExtra, [&](Raster* image, Mask* mask, Raster* target) { index.Process(image, mask, target); },
+      [&](const Raster& image, const Mask* mask, Raster& target) {
+        reference::VegIndex(index, image, mask, target);
+      });
+  return result << ", code " << code << ", bandIndex " << ::testing::PrintToString(roles);
+}
+
+TEST_P(VegIndexDifferential, AgreesWithTheTwinOnOneIndexOfPixelsOfFourChannels) {
+  tests::Random random(20240504);
+  for (unsigned int code = 0; code < kIndices; ++code) {
+    for (const PixelType& out : tests::kPixelTypes) {
+      const int trials = out.element == tessel::eDT_32F ? 8 : 2;
+      for (int trial = 0; trial < trials; ++trial)
+        ASSERT_TRUE(AgreesOnPixelsOfFourChannels(random, GetParam().element, out.element, code));
+    }
+  }
 }
 
 TEST_P(VegIndexDifferential, AgreesWithTheTwinWhereInputAndOutputAreOneRaster) {
@@ -617,6 +661,9 @@ TEST_P(VegIndexDifferential, AgreesWithTheTwinWhereInputAndOutputAreOneRaster) {
 }
 
 INSTANTIATE_TEST_SUITE_P(From, VegIndexDifferential, ::testing::ValuesIn(tests::kPixelTypes),
+                         ::testing::PrintToStringParamName());
+INSTANTIATE_TEST_SUITE_P(From, VegIndexOfNarrowSamples,
+                         ::testing::ValuesIn(tests::kPixelTypes.begin(), tests::kPixelTypes.begin() + 4),
                          ::testing::PrintToStringParamName());
 
 // ---- contract
