@@ -51,15 +51,15 @@ GRIDMILL_INLINE float PercentOf(float value, float quotient, float low, float hi
 ///
 /// Product and quotient in `double` differ by less than 2^-51 of the quotient, in relation to it. The
 /// dividend has 31 bits and the range 24: a quotient that is not half way between two floats is further than
-/// 2^-49 from there, so that both go to the same float. One that is half way, with 25 bits, times the odd
-/// part of the range makes a dividend of 31 bits: this odd part is below 128. The product is half way too if
-/// the error of the gain is below 2^-54.
+/// 2^-49 from there, so that both go to the same float. One that is half way has an odd part of 25 bits.
+/// Times the odd part of the range it is 25 times that of the distance, which has 24 bits: the range's is
+/// below 25. The product is half way too if the error of the gain is below 2^-54.
 bool GainServes(float range) {
   int exponent = 0;
   auto odd = static_cast<std::uint32_t>(std::ldexp(std::frexp(std::fabs(range), &exponent), 24));
   if (!std::isfinite(range) || odd == 0) return false;
   while (odd % 2 == 0) odd /= 2;
-  return odd >= 128 || std::fabs(std::fma(100.0 / odd, odd, -100.0)) < 100 * 0x1p-54;
+  return odd >= 25 || std::fabs(std::fma(100.0 / odd, odd, -100.0)) < 100 * 0x1p-54;
 }
 
 /// Floats below have fewer bits, for which a gain does not serve.
