@@ -55,9 +55,9 @@ GRIDMILL_INLINE float PercentOf(float value, float quotient, float low, float hi
 /// Times the odd part of the range it is 25 times that of the distance, which has 24 bits: the range's is
 /// below 25. The product is half way too if the error of the gain is below 2^-54.
 bool GainServes(float range) {
+  if (!std::isfinite(range) || range == 0.0f) return false;
   int exponent = 0;
   auto odd = static_cast<std::uint32_t>(std::ldexp(std::frexp(std::fabs(range), &exponent), 24));
-  if (!std::isfinite(range) || odd == 0) return false;
   while (odd % 2 == 0) odd /= 2;
   return odd >= 25 || std::fabs(std::fma(100.0 / odd, odd, -100.0)) < 100 * 0x1p-54;
 }

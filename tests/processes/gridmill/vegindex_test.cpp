@@ -313,15 +313,16 @@ TEST(VegIndex, ExcludedPixelHoldsNoDataInEveryRequestedChannelWhateverItsSamples
             (std::vector<float>{0, 1, 77, -1e20f, -1e20f, 77, 0, 1, 77}));
 }
 
-/// A raster of two rows, of which the second cannot be read.
+/// A raster of two rows, one page of memory each, of which the second cannot be read.
 struct HalfReadable {
   std::size_t page = static_cast<std::size_t>(sysconf(_SC_PAGESIZE));
   void* memory = mmap(nullptr, 2 * page, PROT_READ | PROT_WRITE, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
-  Raster raster{
-      {static_cast<std::uint32_t>(page), 2, 1, tessel::eDT_8U}, {}, static_cast<unsigned char*>(memory)};
+  Raster raster;
 
-  HalfReadable() {
-    std::fill_n(raster.data, page, static_cast<unsigned char>(3));
+  HalfReadable(DataType type, std::uint32_t channels)
+      : raster({static_cast<std::uint32_t>(page) / (type.sizeBits / 8 * channels), 2, channels, type}, {},
+               static_cast<unsigned char*>(memory)) {
+    std::fill_n(raster.data, page, static_cast<unsigned char>(1));
     mprotect(raster.data + page, page, PROT_NONE);
   }
   HalfReadable(const HalfReadable&) = delete;
@@ -330,16 +331,21 @@ struct HalfReadable {
 };
 
 TEST(VegIndex, SamplesOfARowOfExcludedPixelsAreNotRead) {
-  HalfReadable in;
-  ASSERT_NE(in.memory, MAP_FAILED);
-  const std::uint32_t width = in.raster.width;
-  Mask mask(width, 2);
-  for (std::uint32_t x = 0; x < width; ++x) mask.SetValid(static_cast<int>(x), 1, false);
-  Image<float> out({width, 2});
-  OperatorOf(RequestsOf({eINDEX_DVI}), {eBAND_NIR}).Process(&in.raster, &mask, &out);
-  for (int x = 0; x < static_cast<int>(width); ++x) {
-    ASSERT_EQ(out.At(x, 0), 3.0f);
-    ASSERT_EQ(out.At(x, 1), -1e20f);
+  for (const std::uint32_t channels : {1u, 4u}) {
+    for (const Codes& requests : {RequestsOf({eINDEX_RVI}), Codes(kIndices, 1)}) {
+      HalfReadable in(tessel::eDT_16U, channels);
+      ASSERT_NE(in.memory, MAP_FAILED);
+      const std::uint32_t width = in.raster.width, indices = requests == Codes(kIndices, 1) ? kIndices : 1;
+      Mask mask(width, 2);
+      for (std::uint32_t x = 0; x < width; ++x) mask.SetValid(static_cast<int>(x), 1, false);
+      Image<float> out({width, 2, indices});
+      OperatorOf(requests, {eBAND_RED, eBAND_NIR, eBAND_GREEN, eBAND_RED_EDGE})
+          .Process(&in.raster, &mask, &out);
+      for (int x = 0; x < static_cast<int>(width); ++x) {
+        ASSERT_NE(out.At(x, 0, indices - 1), -1e20f);
+        for (std::uint32_t c = 0; c < indices; ++c) ASSERT_EQ(out.At(x, 1, c), -1e20f);
+      }
+    }
   }
 }
 
