@@ -53,7 +53,7 @@ GRIDMILL_MULTIVERSION void BinRow(const float* __restrict value, const Histogram
     const bool zero = low >= v;
     const bool hundred = (v >= high) | (held & (bin >= bins));
     const bool inside = !(invalid | zero | hundred) & held;
-    const float limit = !zero & hundred ? 100.0f : 0.0f;
+    const float limit = (!zero & hundred) ? 100.0f : 0.0f;
     binned.constant[i] = invalid ? value[i] : limit;
     binned.inside[i] = inside;
     binned.bin[i] = inside ? bin : 0;

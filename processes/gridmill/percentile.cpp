@@ -78,7 +78,7 @@ GRIDMILL_MULTIVERSION void BinRow(const float* __restrict value, const Splines& 
     const bool zero = (low[i] == high[i]) | (low[i] >= v);
     const bool hundred = (v >= high[i]) | (held & (bin >= bins));
     const bool inside = !(invalid | zero | hundred) & held;
-    const float limit = !zero & hundred ? 100.0f : 0.0f;
+    const float limit = (!zero & hundred) ? 100.0f : 0.0f;
     binned.constant[i] = invalid ? noData : limit;
     binned.inside[i] = inside;
     binned.knot[i] = firstKnot[i] + (inside ? bin : 0);
