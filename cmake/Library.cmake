@@ -13,19 +13,24 @@ set(GRIDMILL_SOURCES
     processes/gridmill/combchange.cpp
     processes/gridmill/filterasp.cpp
     processes/gridmill/filterslp.cpp
+    processes/gridmill/iiidatatransfer.cpp
     processes/gridmill/intenpercent.cpp
     processes/gridmill/intenratiochange.cpp
     processes/gridmill/magnitudechange.cpp
     processes/gridmill/mirrorimg.cpp
     processes/gridmill/normalize.cpp
     processes/gridmill/percentile.cpp
+    processes/gridmill/rangeclasses.cpp
+    processes/gridmill/rasterstatistics.cpp
     processes/gridmill/singlechange.cpp
+    processes/gridmill/spotblue.cpp
     processes/gridmill/sqrgradient.cpp
     processes/gridmill/tasseledcapchange.cpp
     processes/gridmill/vegindex.cpp
     processes/gridmill/vollath.cpp
     processes/gridmill/frame/changerows.cpp
     processes/gridmill/frame/filterrows.cpp
+    processes/gridmill/frame/pixelreader.cpp
     processes/gridmill/frame/pixelwriter.cpp
     processes/gridmill/frame/scanlock.cpp
     processes/gridmill/kernels/changenodata.cpp
@@ -37,9 +42,12 @@ set(GRIDMILL_SOURCES
     processes/gridmill/kernels/maskedcells.cpp
     processes/gridmill/kernels/orderedsums.cpp
     processes/gridmill/kernels/percentilespline.cpp
+    processes/gridmill/kernels/pixelgather.cpp
     processes/gridmill/kernels/pixelplanes.cpp
     processes/gridmill/kernels/reverse.cpp
     processes/gridmill/kernels/rowconversions.cpp
+    processes/gridmill/kernels/samplecounts.cpp
+    processes/gridmill/kernels/syntheticblue.cpp
     processes/gridmill/kernels/thresholds.cpp
     processes/gridmill/kernels/vegetation.cpp
     processes/gridmill/kernels/wholedegrees.cpp)
@@ -73,6 +81,7 @@ set(GRIDMILL_HEADERS
     processes/gridmill/frame/processorcache.h
     processes/gridmill/gridmill.h
     processes/gridmill/ichange.h
+    processes/gridmill/iiidatatransfer.h
     processes/gridmill/intenpercent.h
     processes/gridmill/intenratiochange.h
     processes/gridmill/iprocessor.h
@@ -80,7 +89,10 @@ set(GRIDMILL_HEADERS
     processes/gridmill/mirrorimg.h
     processes/gridmill/normalize.h
     processes/gridmill/percentile.h
+    processes/gridmill/rangeclasses.h
+    processes/gridmill/rasterstatistics.h
     processes/gridmill/singlechange.h
+    processes/gridmill/spotblue.h
     processes/gridmill/sqrgradient.h
     processes/gridmill/tasseledcapchange.h
     processes/gridmill/vegindex.h

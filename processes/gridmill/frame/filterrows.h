@@ -17,6 +17,7 @@ struct FilterShape {
   Walk in = Walk::kPixels;
   std::size_t outSamples = 1;  ///< written to each pixel
   Walk out = Walk::kPixels;
+  std::size_t inSamples = 0;  ///< read from each pixel, where the input may be of another type than is read
 };
 
 /// Pixels of one row, as a row function gets them.

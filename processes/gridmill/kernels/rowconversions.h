@@ -33,11 +33,6 @@ const float* FloatRow(const In* source, std::size_t stride, std::size_t count, f
 template <class Sample>
 void CopyRow(const Sample* source, std::size_t stride, std::size_t count, Sample* target);
 
-/// Converts the first `channels` samples of `count` pixels, `stride` elements apart, to planes of `double`.
-template <class In>
-void LoadPlanes(const In* first, std::size_t stride, std::size_t channels, std::size_t count,
-                double (*planes)[kBlock]);
-
 /// Stores `PlainCast<Out>` of `count` samples of any type.
 template <class Value, class Out>
 void StoreCast(const Value* values, std::size_t count, Out* target);
