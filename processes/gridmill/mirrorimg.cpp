@@ -73,6 +73,27 @@ void TransferReversed(const In* source, std::size_t channels, std::size_t pixels
   }
 }
 
+/// How the samples of two types are moved, for a walk that knows bytes only.
+struct Moves {
+  std::size_t inBytes, outBytes;  ///< of a sample
+  tessel::DataType outElement;
+  void (*samples)(const unsigned char* source, std::size_t count, unsigned char* target);
+  void (*reversed)(const unsigned char* source, std::size_t channels, std::size_t pixels,
+                   unsigned char* target);
+};
+
+template <class In, class Out>
+Moves MovesOf() {
+  using Byte = unsigned char;
+  const auto samples = [](const Byte* source, std::size_t count, Byte* target) {
+    TransferSamples(reinterpret_cast<const In*>(source), count, reinterpret_cast<Out*>(target));
+  };
+  const auto reversed = [](const Byte* source, std::size_t channels, std::size_t pixels, Byte* target) {
+    TransferReversed(reinterpret_cast<const In*>(source), channels, pixels, reinterpret_cast<Out*>(target));
+  };
+  return {sizeof(In), sizeof(Out), tessel::DataType::Of<Out>(), samples, reversed};
+}
+
 // ---- image
 
 /// A pixel of the window on its way: where it comes from and where it goes along the flip.
@@ -91,8 +112,8 @@ struct Step {
 };
 
 /// The rasters of a flip, with the pixels of the input as the unit of length in both.
-template <class In, class Out>
 struct Flip {
+  Moves moves;
   const tessel::Raster& in;
   const tessel::Raster& out;
   const tessel::Mask* mask;
@@ -101,29 +122,17 @@ struct Flip {
 
   std::size_t Channels() const { return in.channels; }
 
-  /// Every row reversed.
-  void Rows() const {
-    frame::PixelWriter writer(out, tessel::DataType::Of<Out>(), Channels(), frame::kMaxBlock,
-                              frame::Walk::kElements);
+  /// Every row reversed, or the order of the rows.
+  void Whole(bool rows) const {
+    const frame::Walk walk = rows ? frame::Walk::kElements : frame::Walk::kPixels;
+    frame::PixelWriter writer(out, moves.outElement, Channels(), frame::kMaxBlock, walk);
     frame::SerialRows(in.height, [&](std::uint32_t y) {
-      const In* const last = Sample(windowSize - 1, y);
+      const unsigned char* const source = rows ? Source(windowSize - 1, y) : Source(0, windowSize - 1 - y);
       for (std::uint32_t x = 0; x < in.width; x += frame::kMaxBlock) {
         const std::size_t pixels = std::min<std::size_t>(frame::kMaxBlock, in.width - x);
-        TransferReversed(last - static_cast<std::ptrdiff_t>(x * Channels()), Channels(), pixels,
-                         reinterpret_cast<Out*>(writer.At(x, y)));
-        writer.Write(x, y, pixels);
-      }
-    });
-  }
-
-  /// The order of the rows reversed.
-  void Columns() const {
-    frame::PixelWriter writer(out, tessel::DataType::Of<Out>(), Channels(), frame::kMaxBlock);
-    frame::SerialRows(in.height, [&](std::uint32_t y) {
-      const In* const row = Sample(0, windowSize - 1 - y);
-      for (std::uint32_t x = 0; x < in.width; x += frame::kMaxBlock) {
-        const std::size_t pixels = std::min<std::size_t>(frame::kMaxBlock, in.width - x);
-        TransferSamples(row + x * Channels(), pixels * Channels(), reinterpret_cast<Out*>(writer.At(x, y)));
+        const auto bytes = static_cast<std::ptrdiff_t>(x * InBytes());
+        if (rows) moves.reversed(source - bytes, Channels(), pixels, writer.At(x, y));
+        if (!rows) moves.samples(source + bytes, pixels * Channels(), writer.At(x, y));
         writer.Write(x, y, pixels);
       }
     });
@@ -134,16 +143,16 @@ struct Flip {
     std::vector<unsigned char> marked(in.width);
     frame::SerialRows(in.height, [&](std::uint32_t y) {
       tessel::UnpackBits(*mask, tessel::PixelIndex(*mask, 0, y), in.width, marked.data());
-      Out* const row = tessel::PixelAt<Out>(out, 0, y);
+      unsigned char* const row = tessel::PixelAt<unsigned char>(out, 0, y);
       Step step{};
       for (std::uint32_t x = 0, end = 0; x < in.width; x = end) {
         end = RunEnd(marked, x);
         if (marked[x] == 0) {
-          if (!packed) TransferSamples(Sample(x, y), (end - x) * Channels(), row + x * Channels());
+          if (!packed) moves.samples(Source(x, y), (end - x) * Channels(), row + x * OutBytes());
           continue;
         }
         step.Advance(x, windowSize, packed);
-        TransferReversed(Sample(step.source, y), Channels(), end - x, row + step.target * Channels());
+        moves.reversed(Source(step.source, y), Channels(), end - x, row + step.target * OutBytes());
         step.source -= end - x - 1;
         step.target += end - x - 1;
       }
@@ -175,14 +184,19 @@ struct Flip {
   }
 
  private:
-  /// The first sample of a pixel, which may lie outside the image.
-  const In* Sample(std::uint32_t x, std::uint32_t y) const { return tessel::PixelAt<In>(in, x, y); }
+  std::size_t InBytes() const { return Channels() * moves.inBytes; }
+  std::size_t OutBytes() const { return Channels() * moves.outBytes; }
+
+  /// The first sample of a pixel of the input, which may lie outside the image.
+  const unsigned char* Source(std::uint32_t x, std::uint32_t y) const {
+    return tessel::PixelAt<unsigned char>(in, x, y);
+  }
 
   /// The pixels from column `x` to before `end` of one row to another.
   void TransferRun(std::uint32_t x, std::uint32_t end, std::uint32_t source, std::uint32_t target) const {
     const std::uint32_t step = out.channels == in.channels ? end - x : 1;
     for (; x < end; x += step)
-      TransferSamples(Sample(x, source), step * Channels(), tessel::PixelAt<Out>(out, x, target));
+      moves.samples(Source(x, source), step * Channels(), tessel::PixelAt<unsigned char>(out, x, target));
   }
 
   /// The end of the pixels from `x` on that are marked, or not marked, as it is.
@@ -198,15 +212,12 @@ template <class In, class Out>
 class MirrorImg::InnerProcessor : public IProcessor, public details::MirrorImgParams {
  public:
   void Process(tessel::Raster* in, tessel::Mask* mask, tessel::Raster* out) const override {
-    const std::uint32_t windowWidth = Window.empty() ? in->width : Window[2];
-    const std::uint32_t windowHeight = Window.empty() ? in->height : Window[3];
-    if (IsWord(Axis, "VERT")) {
-      const Flip<In, Out> flip{*in, *out, mask, windowWidth, isNewFile};
-      mask == nullptr ? flip.Rows() : flip.MarkedRows();
-    } else if (IsWord(Axis, "HORI")) {
-      const Flip<In, Out> flip{*in, *out, mask, windowHeight, isNewFile};
-      mask == nullptr ? flip.Columns() : flip.MarkedColumns();
-    }
+    const bool rows = IsWord(Axis, "VERT");
+    if (!rows && !IsWord(Axis, "HORI")) return;
+    const std::uint32_t windowSize = Window.empty() ? (rows ? in->width : in->height) : Window[rows ? 2 : 3];
+    const Flip flip{MovesOf<In, Out>(), *in, *out, mask, windowSize, isNewFile};
+    if (mask == nullptr) return flip.Whole(rows);
+    rows ? flip.MarkedRows() : flip.MarkedColumns();
   }
 };
 
