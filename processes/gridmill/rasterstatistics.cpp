@@ -18,7 +18,8 @@ namespace orvik::gridmill {
 
 namespace {
 
-using kernels::kBlock;
+/// Pixels that are counted together.
+constexpr std::size_t kPixels = 1024;
 
 // ---- row
 
@@ -34,38 +35,27 @@ struct Tally {
   template <class In>
   void Count(const In* samples, std::size_t count) {
     kernels::TakeExtremes(samples, count, extremes);
-    if constexpr (std::is_same_v<In, unsigned char>) {
-      bytes.Count(samples, count);
-    } else {
-      kernels::CountSamples(samples, count, *bins);
-    }
+    kernels::CountSamples(samples, count, *bins);
   }
 };
 
-/// The blue band of at most `kBlock` pixels as the bins that it counts in.
-template <class In>
-void BlueBins(const In* pixels, std::size_t stride, std::size_t count, unsigned char* bins) {
-  double samples[3][kBlock], blue[kBlock];
-  for (std::size_t c = 0; c < 3; ++c) kernels::LoadRow(pixels + c, stride, count, samples[c]);
-  kernels::SyntheticBlueRow(samples[0], samples[1], samples[2], count, blue);
-  kernels::BlueBinRow(blue, count, bins);
-}
-
-/// Counts at most `kBlock` pixels.
+/// Counts at most `kPixels` pixels. `planes` is scratch for three channels.
 template <class In>
 void CountRow(const In* pixels, std::size_t stride, std::size_t count, bool synthesises,
-              std::vector<Tally>& tallies) {
+              In (*planes)[kPixels], std::vector<Tally>& tallies) {
+  constexpr bool bytes = std::is_same_v<In, unsigned char>;
   for (std::size_t c = 0; c < tallies.size(); ++c) {
+    In* const plane = planes[std::min<std::size_t>(c, 2)];
+    if (!bytes || (synthesises && tallies.size() > 2 && c < 3))
+      kernels::CopyRow(pixels + c, stride, count, plane);
     if (synthesises && c == 2) {
-      unsigned char bins[kBlock];
-      BlueBins(pixels, stride, count, bins);
-      tallies[c].Count(bins, count);
-    } else if (stride == 1) {
-      tallies[c].Count(pixels, count);
+      unsigned char bins[kPixels];
+      kernels::BlueBinRow(planes[0], planes[1], planes[2], count, bins);
+      tallies[c].bytes.Count(bins, 1, count);
+    } else if constexpr (bytes) {
+      tallies[c].bytes.Count(pixels + c, stride, count);
     } else {
-      In channel[kBlock];
-      kernels::CopyRow(pixels + c, stride, count, channel);
-      tallies[c].Count(channel, count);
+      tallies[c].Count(plane, count);
     }
   }
 }
@@ -77,7 +67,7 @@ template <class In>
 class KeptPixels {
  public:
   KeptPixels(const tessel::Raster& in, tessel::IMaskDecision* decision)
-      : in_(in), decision_(decision), kept_(decision == nullptr ? 0 : kBlock * in.channels) {}
+      : in_(in), decision_(decision), kept_(decision == nullptr ? 0 : kPixels * in.channels) {}
 
   const In* Data() const { return kept_.data(); }
 
@@ -112,7 +102,7 @@ class RasterStatistics::InnerProcessor : public filters::IProcessor, public deta
     CountImage(*in, tallies);
 
     for (std::size_t c = 0; c < counted; ++c) {
-      tallies[c].bytes.AddTo(histograms[c]);
+      tallies[c].bytes.AddTo(histograms[c], tallies[c].extremes);
       minValues[c] = tallies[c].extremes.least;
       maxValues[c] = tallies[c].extremes.greatest;
     }
@@ -121,18 +111,20 @@ class RasterStatistics::InnerProcessor : public filters::IProcessor, public deta
  private:
   void CountImage(const tessel::Raster& in, std::vector<Tally>& tallies) const {
     const bool synthesises = method == eSTATISTICS_SYNTHETIC_BLUE;
-    frame::PixelReader reader(in, tessel::DataType::Of<In>(), in.channels, kBlock);
+    frame::PixelReader reader(in, tessel::DataType::Of<In>(), in.channels, kPixels);
     KeptPixels<In> kept(in, maskDecision);
+    In planes[3][kPixels];
     frame::SerialRows(in.height, [&](std::uint32_t y) {
-      for (std::size_t done = 0; done < in.width; done += kBlock) {
+      for (std::size_t done = 0; done < in.width; done += kPixels) {
         const auto x = static_cast<std::uint32_t>(done);
-        const std::size_t count = std::min<std::size_t>(kBlock, in.width - done);
+        const std::size_t count = std::min<std::size_t>(kPixels, in.width - done);
         const In* const pixels = reinterpret_cast<const In*>(reader.At(x, y, count));
+        kernels::PrefetchAhead(pixels, count * reader.Stride());
         if (maskDecision == nullptr) {
-          CountRow(pixels, reader.Stride(), count, synthesises, tallies);
+          CountRow(pixels, reader.Stride(), count, synthesises, planes, tallies);
         } else {
           const std::size_t valid = kept.Keep(pixels, reader.Stride(), x, y, count);
-          CountRow(kept.Data(), in.channels, valid, synthesises, tallies);
+          CountRow(kept.Data(), in.channels, valid, synthesises, planes, tallies);
         }
       }
     });

@@ -97,104 +97,99 @@ void KeepChannel(const In* samples, int background, const Range* range, std::siz
   }
 }
 
-/// The samples of a channel, trimmed in `float`, or in `double` if they are of this type, as they are
-/// written.
-template <class In, class Out>
-void TrimChannel(const In* samples, float offset, float factor, std::size_t count, Out* target) {
-  double trimmed[kBlock];
-  if constexpr (std::is_same_v<In, double>) {
-    TrimRow<double>(samples, offset, factor, count, trimmed);
-  } else {
-    float scratch[kBlock];
-    TrimRow<float>(kernels::FloatRow(samples, 1, count, scratch), offset, factor, count, trimmed);
-  }
-  kernels::StoreClipped(trimmed, count, target);
-}
-
-/// What the pixels of an image have in common.
-template <class In, class Out>
-class BlueRow {
+/// Pixels on their way to the bands of the output, at most `kBlock`.
+template <class In>
+class BluePixels {
  public:
+  std::size_t count = 0;
+  unsigned char valid[kBlock];  ///< 0: background
+  double blue[kBlock];
+
   /// Samples that are read from a pixel: a triple takes the second one even if there is but one channel.
   static std::size_t SamplesRead(std::size_t channels, bool triple) {
     return std::max<std::size_t>(channels, triple ? 2 : 1);
   }
 
-  BlueRow(const details::BlueParams& params, std::size_t channels, bool triple)
-      : params_(params), channels_(channels), triple_(triple), planes_(SamplesRead(channels, triple)) {
-    for (std::size_t c = 0; c < channels; ++c) whole_.push_back(tessel::PlainCast<int>(params.backGround[c]));
+  BluePixels(const details::BlueParams& params, std::size_t channels, bool triple)
+      : params_(params), channels_(channels), planes_(SamplesRead(channels, triple)) {
+    for (std::size_t c = 0; c < channels; ++c)
+      background_.push_back(tessel::PlainCast<int>(params.backGround[c]));
     for (std::size_t c = 0; c < std::min<std::size_t>(channels, 2); ++c)
       ranges_.emplace_back(params.min[c], params.max[c]);
-    for (std::size_t c = 0; c < (triple ? 3 : 1); ++c)
-      written_.push_back(tessel::PlainCast<Out>(params.backGround[c]));
   }
 
-  void Write(const frame::FilterBlock<In, Out>& block) {
-    const std::size_t count = block.pixels;
+  /// @param mask  a byte for each pixel, or null if all are valid
+  void Load(const In* pixels, std::size_t stride, std::size_t pixelCount, const unsigned char* mask) {
+    count = pixelCount;
     for (std::size_t c = 0; c < planes_.size(); ++c)
-      kernels::CopyRow(block.image + c, block.stride, count, planes_[c].data());
-    unsigned char valid[kBlock];
-    if (block.masked) std::copy_n(block.valid, count, valid);
-    if (!block.masked) std::fill_n(valid, count, static_cast<unsigned char>(1));
-    double blue[kBlock] = {};
-    Judge(count, blue, valid);
-    if (triple_) {
-      Out bands[3][kBlock];
-      WriteColours(count, bands);
-      WriteBlue(blue, count, bands[2]);
-      for (std::size_t c = 0; c < 3; ++c) WriteBackground(valid, c, count, bands[c]);
-      kernels::StorePixels(bands, count, block.target);
+      kernels::CopyRow(pixels + c, stride, count, planes_[c].data());
+    std::fill_n(valid, count, static_cast<unsigned char>(1));
+    if (mask != nullptr) std::copy_n(mask, count, valid);
+    for (std::size_t c = 0; c < channels_; ++c)
+      KeepChannel(Channel(c), background_[c], c < 2 ? &ranges_[c] : nullptr, count, valid);
+    Synthesise();
+  }
+
+  const In* Channel(std::size_t c) const { return planes_[c].data(); }
+
+  /// A channel trimmed in `float`, or in `double` if its samples are of this type.
+  void TrimChannel(std::size_t c, double* trimmed) const {
+    const float offset = params_.min[c], factor = params_.scale[c];
+    if constexpr (std::is_same_v<In, double>) {
+      TrimRow<double>(Channel(c), offset, factor, count, trimmed);
     } else {
-      WriteBlue(blue, count, block.target);
-      WriteBackground(valid, 0, count, block.target);
+      float scratch[kBlock];
+      TrimRow<float>(kernels::FloatRow(Channel(c), 1, count, scratch), offset, factor, count, trimmed);
     }
   }
 
  private:
-  /// Makes the blue band and clears the bytes of the pixels that are background.
-  void Judge(std::size_t count, double* blue, unsigned char* valid) const {
-    for (std::size_t c = 0; c < channels_; ++c)
-      KeepChannel(planes_[c].data(), whole_[c], c < 2 ? &ranges_[c] : nullptr, count, valid);
-    if (channels_ < 3) return;
-    double samples[3][kBlock];
-    for (std::size_t c = 0; c < 3; ++c) kernels::LoadRow(planes_[c].data(), 1, count, samples[c]);
-    kernels::SyntheticBlueRow(samples[0], samples[1], samples[2], count, blue);
-    KeepWithin(blue, params_.min[2], params_.max[2], count, valid);
-  }
-
-  /// Deliberate: the first two bands change places.
-  void WriteColours(std::size_t count, Out (*bands)[kBlock]) const {
-    for (std::size_t c = 0; c < 2; ++c) {
-      if (params_.trim) {
-        TrimChannel(planes_[c].data(), params_.min[c], params_.scale[c], count, bands[1 - c]);
-      } else {
-        kernels::StoreCast(planes_[c].data(), count, bands[1 - c]);
-      }
+  /// The blue band, trimmed or limited, after its own range has been judged.
+  void Synthesise() {
+    std::fill_n(blue, count, 0.0);
+    if (channels_ >= 3) {
+      kernels::SyntheticBlueRow(Channel(0), Channel(1), Channel(2), count, blue);
+      KeepWithin(blue, params_.min[2], params_.max[2], count, valid);
     }
-  }
-
-  void WriteBlue(double* blue, std::size_t count, Out* target) const {
     if (params_.trim) {
       TrimRow<double>(blue, params_.min[2], params_.scale[2], count, blue);
     } else {
       LimitRow(count, blue);
     }
-    kernels::StoreClipped(blue, count, target);
-  }
-
-  /// Deliberate: a background pixel keeps the order of the entries.
-  void WriteBackground(const unsigned char* valid, std::size_t c, std::size_t count, Out* target) const {
-    if (!kernels::AllValid(valid, count)) kernels::ReplaceMasked(valid, written_[c], count, target);
   }
 
   const details::BlueParams& params_;
   std::size_t channels_;
-  bool triple_;
   std::vector<std::array<In, kBlock>> planes_;
-  std::vector<int> whole_;  ///< background of each channel in whole numbers
+  std::vector<int> background_;  ///< of each channel, in whole numbers
   std::vector<Range> ranges_;
-  std::vector<Out> written_;  ///< background of each band as it is written
 };
+
+/// The bands of the pixels as they are written: three, or blue alone.
+template <class In, class Out>
+void WriteBands(const BluePixels<In>& pixels, const details::BlueParams& params, bool triple, Out* target) {
+  Out bands[3][kBlock];
+  Out* const blue = triple ? bands[2] : target;
+  for (std::size_t c = 0; c < (triple ? 2 : 0); ++c) {
+    // Deliberate: the first two bands change places.
+    Out* const band = bands[1 - c];
+    double trimmed[kBlock];
+    if (params.trim) {
+      pixels.TrimChannel(c, trimmed);
+      kernels::StoreClipped(trimmed, pixels.count, band);
+    } else {
+      kernels::StoreCast(pixels.Channel(c), pixels.count, band);
+    }
+  }
+  kernels::StoreClipped(pixels.blue, pixels.count, blue);
+  if (!kernels::AllValid(pixels.valid, pixels.count)) {
+    // Deliberate: a background pixel keeps the order of the entries.
+    for (std::size_t c = 0; c < (triple ? 3 : 1); ++c)
+      kernels::ReplaceMasked(pixels.valid, tessel::PlainCast<Out>(params.backGround[c]), pixels.count,
+                             triple ? bands[c] : target);
+  }
+  if (triple) kernels::StorePixels(bands, pixels.count, target);
+}
 
 // ---- image
 
@@ -206,11 +201,14 @@ class SPOTBlue::InnerProcessor : public filters::IProcessor, public details::Blu
   void Process(tessel::Raster* in, tessel::Mask* mask, tessel::Raster* out) const override {
     if (in->height < 1 || in->width < 1) return;
     const bool triple = out->channels == 3;
-    BlueRow<In, Out> row(*this, in->channels, triple);
-    const std::size_t read = BlueRow<In, Out>::SamplesRead(in->channels, triple);
+    BluePixels<In> pixels(*this, in->channels, triple);
+    const std::size_t read = BluePixels<In>::SamplesRead(in->channels, triple);
     const std::size_t written = triple ? 3 : 1;
     const frame::FilterShape shape{kBlock, frame::Walk::kPixels, written, frame::Walk::kPixels, read};
-    frame::FilterRows<In, Out>(*in, mask, *out, shape, [&row](const auto& block) { row.Write(block); });
+    frame::FilterRows<In, Out>(*in, mask, *out, shape, [&](const auto& block) {
+      pixels.Load(block.image, block.stride, block.pixels, block.masked ? block.valid : nullptr);
+      WriteBands(pixels, *this, triple, block.target);
+    });
   }
 };
 

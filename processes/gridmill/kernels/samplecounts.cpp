@@ -1,7 +1,6 @@
 #include "processes/gridmill/kernels/samplecounts.h"
 
 #include <algorithm>
-#include <cstring>
 #include <limits>
 #include <type_traits>
 
@@ -13,31 +12,41 @@ namespace orvik::kernels {
 
 namespace {
 
-/// Minima and maxima side by side, which need not be taken in order.
-inline constexpr std::size_t kSideBySide = 64;
+/// Minima and maxima side by side, which need not be taken in order: two registers of the widest kind.
+template <class Sample>
+inline constexpr std::size_t kSideBySide = 128 / sizeof(Sample);
+
+/// Takes samples at one place each.
+template <std::size_t lanes, class Sample>
+GRIDMILL_INLINE void TakeLanes(const Sample* least, const Sample* greatest, Sample* low, Sample* high) {
+  for (std::size_t k = 0; k < lanes; ++k) {
+    low[k] = least[k] < low[k] ? least[k] : low[k];
+    high[k] = greatest[k] > high[k] ? greatest[k] : high[k];
+  }
+}
+
+/// Takes the upper half of the places into the lower one, until there is one place.
+template <std::size_t lanes, class Sample>
+GRIDMILL_INLINE void FoldLanes(Sample* low, Sample* high) {
+  if constexpr (lanes > 1) {
+    TakeLanes<lanes / 2>(low + lanes / 2, high + lanes / 2, low, high);
+    FoldLanes<lanes / 2>(low, high);
+  }
+}
 
 template <class Sample>
 GRIDMILL_MULTIVERSION void ExtremesOf(const Sample* samples, std::size_t count, Sample& least,
                                       Sample& greatest) {
-  Sample low[kSideBySide], high[kSideBySide];
-  std::fill_n(low, kSideBySide, least);
-  std::fill_n(high, kSideBySide, greatest);
+  constexpr std::size_t lanes = kSideBySide<Sample>;
+  Sample low[lanes], high[lanes];
+  std::fill_n(low, lanes, least);
+  std::fill_n(high, lanes, greatest);
   std::size_t i = 0;
-  for (; i + kSideBySide <= count; i += kSideBySide) {
-    for (std::size_t k = 0; k < kSideBySide; ++k) {
-      const Sample s = samples[i + k];
-      low[k] = s < low[k] ? s : low[k];
-      high[k] = s > high[k] ? s : high[k];
-    }
-  }
-  for (std::size_t k = 0; i < count; ++i, ++k) {
-    low[k] = samples[i] < low[k] ? samples[i] : low[k];
-    high[k] = samples[i] > high[k] ? samples[i] : high[k];
-  }
-  for (std::size_t k = 0; k < kSideBySide; ++k) {
-    least = low[k] < least ? low[k] : least;
-    greatest = high[k] > greatest ? high[k] : greatest;
-  }
+  for (; i + lanes <= count; i += lanes) TakeLanes<lanes>(samples + i, samples + i, low, high);
+  for (; i < count; ++i) TakeLanes<1>(samples + i, samples + i, low, high);
+  FoldLanes<lanes>(low, high);
+  least = low[0];
+  greatest = high[0];
 }
 
 /// The first of the zeros, which keeps its sign.
@@ -54,6 +63,21 @@ GRIDMILL_INLINE bool HasBin(Sample sample, std::size_t bins, std::size_t& bin) {
     bin = static_cast<std::size_t>(sample);
     return bin < bins;
   }
+}
+
+/// Counts samples that all have a bin, every second one in a table that may be the same one.
+template <class Sample>
+inline void CountAll(const Sample* samples, std::size_t stride, std::size_t count, std::uint32_t* even,
+                     std::uint32_t* odd) {
+  constexpr std::size_t together = 8;
+  std::size_t i = 0;
+  for (; i + together <= count; i += together) {
+    for (std::size_t k = 0; k < together; k += 2) {
+      ++even[samples[(i + k) * stride]];
+      ++odd[samples[(i + k + 1) * stride]];
+    }
+  }
+  for (; i < count; ++i) ++even[samples[i * stride]];
 }
 
 }  // namespace
@@ -85,11 +109,8 @@ void CountSamples(const Sample* samples, std::size_t count, std::vector<int>& bi
   const std::size_t size = bins.size();
   // Unsigned counts may wrap.
   auto* const counts = reinterpret_cast<unsigned int*>(bins.data());
-  if constexpr (std::is_same_v<Sample, unsigned char> || std::is_same_v<Sample, unsigned short>) {
-    if (size > std::numeric_limits<Sample>::max()) {
-      for (std::size_t i = 0; i < count; ++i) ++counts[samples[i]];
-      return;
-    }
+  if constexpr (std::is_same_v<Sample, unsigned short>) {
+    if (size > std::numeric_limits<Sample>::max()) return CountAll(samples, 1, count, counts, counts);
   }
   for (std::size_t i = 0; i < count; ++i) {
     std::size_t bin;
@@ -97,21 +118,22 @@ void CountSamples(const Sample* samples, std::size_t count, std::vector<int>& bi
   }
 }
 
-void ByteCounts::Count(const unsigned char* bytes, std::size_t count) {
-  std::size_t i = 0;
-  for (; i + 8 <= count; i += 8) {
-    std::uint64_t word;
-    std::memcpy(&word, bytes + i, sizeof(word));
-    for (std::size_t k = 0; k < 8; ++k) ++tables_[k % 4][word >> (8 * k) & 255];
-  }
-  for (; i < count; ++i) ++tables_[0][bytes[i]];
+void ByteCounts::Count(const unsigned char* bytes, std::size_t stride, std::size_t count) {
+  std::uint32_t* const even = tables_[0].data();
+  std::uint32_t* const odd = tables_[1].data();
+  if (stride == 1) return CountAll(bytes, 1, count, even, odd);
+  if (stride == 3) return CountAll(bytes, 3, count, even, odd);
+  if (stride == 4) return CountAll(bytes, 4, count, even, odd);
+  CountAll(bytes, stride, count, even, odd);
 }
 
-void ByteCounts::AddTo(std::vector<int>& bins) const {
+void ByteCounts::AddTo(std::vector<int>& bins, Extremes& extremes) const {
   auto* const counts = reinterpret_cast<unsigned int*>(bins.data());
-  const std::size_t size = std::min<std::size_t>(bins.size(), 256);
-  for (std::size_t i = 0; i < size; ++i)
-    counts[i] += tables_[0][i] + tables_[1][i] + tables_[2][i] + tables_[3][i];
+  for (std::size_t i = 0; i < 256; ++i) {
+    const std::uint32_t count = tables_[0][i] + tables_[1][i];
+    if (i < bins.size()) counts[i] += count;
+    if (count != 0) extremes.Take(static_cast<float>(i));
+  }
 }
 
 template void TakeExtremes(const char*, std::size_t, Extremes&);

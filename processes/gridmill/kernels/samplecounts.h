@@ -29,17 +29,18 @@ void TakeExtremes(const Sample* samples, std::size_t count, Extremes& extremes);
 template <class Sample>
 void CountSamples(const Sample* samples, std::size_t count, std::vector<int>& bins);
 
-/// Counts of bytes, which go to four tables in turn: neighbours are often equal, and a count that has just
+/// Counts of bytes, which go to two tables in turn: neighbours are often equal, and a count that has just
 /// been stored cannot be loaded at once.
 class ByteCounts {
  public:
-  void Count(const unsigned char* bytes, std::size_t count);
+  /// @param stride  bytes from one to the next
+  void Count(const unsigned char* bytes, std::size_t stride, std::size_t count);
 
-  /// Adds the counts to the first 256 bins, of which there may be less.
-  void AddTo(std::vector<int>& bins) const;
+  /// Adds the counts to the first 256 bins, of which there may be less, and takes the extremes of the bytes.
+  void AddTo(std::vector<int>& bins, Extremes& extremes) const;
 
  private:
-  std::array<std::array<std::uint32_t, 256>, 4> tables_{};
+  std::array<std::array<std::uint32_t, 256>, 2> tables_{};
 };
 
 }  // namespace orvik::kernels

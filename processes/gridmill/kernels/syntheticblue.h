@@ -11,9 +11,11 @@ GRIDMILL_INLINE double SyntheticBlue(double s0, double s1, double s2) {
   return s0 * 0.873393 + 13.9054 - s1 * 0.138254 - s2 * 0.100616;
 }
 
-void SyntheticBlueRow(const double* s0, const double* s1, const double* s2, std::size_t count, double* blue);
+template <class Sample>
+void SyntheticBlueRow(const Sample* s0, const Sample* s1, const Sample* s2, std::size_t count, double* blue);
 
-/// Values truncated to 32 bits and limited to 0 to 255. NaN and values that leave 32 bits give 0.
-void BlueBinRow(const double* blue, std::size_t count, unsigned char* bins);
+/// Blue truncated to 32 bits and limited to 0 to 255. NaN and values that leave 32 bits give 0.
+template <class Sample>
+void BlueBinRow(const Sample* s0, const Sample* s1, const Sample* s2, std::size_t count, unsigned char* bins);
 
 }  // namespace orvik::kernels
