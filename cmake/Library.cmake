@@ -33,6 +33,7 @@ set(GRIDMILL_SOURCES
     processes/gridmill/frame/pixelreader.cpp
     processes/gridmill/frame/pixelwriter.cpp
     processes/gridmill/frame/scanlock.cpp
+    processes/gridmill/kernels/bytecolours.cpp
     processes/gridmill/kernels/changenodata.cpp
     processes/gridmill/kernels/channelratio.cpp
     processes/gridmill/kernels/difference.cpp
@@ -49,6 +50,7 @@ set(GRIDMILL_SOURCES
     processes/gridmill/kernels/samplecounts.cpp
     processes/gridmill/kernels/syntheticblue.cpp
     processes/gridmill/kernels/thresholds.cpp
+    processes/gridmill/kernels/validrange.cpp
     processes/gridmill/kernels/vegetation.cpp
     processes/gridmill/kernels/wholedegrees.cpp)
 list(TRANSFORM GRIDMILL_SOURCES PREPEND ${PROJECT_SOURCE_DIR}/)

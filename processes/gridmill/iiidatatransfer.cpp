@@ -70,14 +70,19 @@ void TransferRow(const kernels::PixelGather& gather, const unsigned char* row, s
 
 // ---- image
 
+bool IsEmpty(const tessel::Raster& raster) { return raster.width < 1 || raster.height < 1; }
+
 /// The mapping of an image.
 struct Mapping {
   std::size_t elements;  ///< of a pixel that are moved
+  bool repeats;  ///< rows of one input row may be written together: no pixel reaches into the next one
   std::vector<std::uint32_t> columns;
   std::vector<std::uint32_t> rows;
 
-  Mapping(const details::IIIParams& of, const tessel::Raster& in, const tessel::Raster& out)
-      : elements(frame::ElementsOf(in)) {
+  Mapping(const details::IIIParams& of, const tessel::Raster& in, const tessel::Raster& out,
+          const tessel::DataType& outElement)
+      : elements(frame::ElementsOf(in)),
+        repeats(frame::Holds(out, outElement) && elements <= frame::ElementsOf(out)) {
     const auto& [inX, inY, inWidth, inHeight] = of.inRegion;
     const auto& [outX, outY, outWidth, outHeight] = of.outRegion;
     const double sx = static_cast<double>(outWidth) / inWidth;
@@ -96,7 +101,7 @@ void TransferImage(const Mapping& mapping, frame::PixelReader& reader, std::size
   const auto& rows = mapping.rows;
   for (std::size_t y = 0, end; y < rows.size(); y = end) {
     end = y + 1;
-    while (end < rows.size() && rows[end] == rows[y]) ++end;
+    while (mapping.repeats && end < rows.size() && rows[end] == rows[y]) ++end;
     const unsigned char* const row = reader.At(0, rows[y], inWidth);
     for (std::size_t x = 0; x < mapping.columns.size(); x += pixels) {
       const std::size_t count = std::min(pixels, mapping.columns.size() - x);
@@ -119,9 +124,8 @@ template <class In, class Out>
 class IIIDataTransfer::InnerProcessor : public filters::IProcessor, public details::IIIParams {
  public:
   void Process(tessel::Raster* in, tessel::Mask*, tessel::Raster* out) const override {
-    const bool isEmpty = in->width < 1 || in->height < 1 || in->channels < 1;
-    if (resampleType != eRESAMPLE_NEAREST || isEmpty) return;
-    const Mapping mapping(*this, *in, *out);
+    if (resampleType != eRESAMPLE_NEAREST || IsEmpty(*in) || IsEmpty(*out) || in->channels < 1) return;
+    const Mapping mapping(*this, *in, *out, tessel::DataType::Of<Out>());
     const std::size_t elements = mapping.elements;
     const kernels::PixelGather gather(mapping.columns, elements * sizeof(In), in->width);
     const std::size_t pixels = frame::DensePixels(elements, kSamples);

@@ -106,7 +106,7 @@ class Classes {
     const auto difference = [noData](double v) -> double { return static_cast<float>(v) - noData; };
     Add({[&](double v) { return difference(v) > -1e-9; }, [&](double v) { return difference(v) < 1e-9; }}, 0);
     if constexpr (kNarrow<Value>) {
-      if (ranges_.size() > kCompared) FillTable();
+      if (ranges_.size() > kCompared || highest_ > 255) FillTable();
     }
   }
 

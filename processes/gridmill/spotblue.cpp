@@ -2,21 +2,19 @@
 
 #include <algorithm>
 #include <array>
-#include <cmath>
 #include <cstddef>
-#include <cstdint>
-#include <limits>
 #include <type_traits>
 #include <vector>
 
 #include "basic/tessel/plaincast.h"
 #include "processes/gridmill/frame/filterrows.h"
 #include "processes/gridmill/frame/frame.h"
+#include "processes/gridmill/kernels/bytecolours.h"
 #include "processes/gridmill/kernels/maskedcells.h"
 #include "processes/gridmill/kernels/multiversion.h"
 #include "processes/gridmill/kernels/rowconversions.h"
 #include "processes/gridmill/kernels/syntheticblue.h"
-#include "processes/gridmill/kernels/thresholds.h"
+#include "processes/gridmill/kernels/validrange.h"
 
 namespace orvik::gridmill {
 
@@ -25,39 +23,6 @@ namespace {
 using kernels::kBlock;
 
 // ---- row
-
-template <class In>
-inline constexpr bool kNarrow = std::is_integral_v<In> && sizeof(In) <= 2;
-
-/// The values from `lower` to `upper`; a limit of NaN is none.
-struct Range {
-  float lower;
-  float upper;
-
-  Range(float least, float most)
-      : lower(std::isnan(least) ? -std::numeric_limits<float>::infinity() : least),
-        upper(std::isnan(most) ? std::numeric_limits<float>::infinity() : most) {}
-};
-
-GRIDMILL_MULTIVERSION void KeepOthers(const int* __restrict samples, int background, std::size_t count,
-                                      unsigned char* __restrict valid) {
-  for (std::size_t i = 0; i < count; ++i) valid[i] &= static_cast<unsigned char>(samples[i] != background);
-}
-
-GRIDMILL_MULTIVERSION void KeepWithin(const int* __restrict samples, Range range, std::size_t count,
-                                      unsigned char* __restrict valid) {
-  for (std::size_t i = 0; i < count; ++i) {
-    const auto value = static_cast<float>(samples[i]);
-    valid[i] &= static_cast<unsigned char>((value >= range.lower) & (value <= range.upper));
-  }
-}
-
-/// NaN is within every range.
-GRIDMILL_MULTIVERSION void KeepWithin(const double* __restrict values, double lower, double upper,
-                                      std::size_t count, unsigned char* __restrict valid) {
-  for (std::size_t i = 0; i < count; ++i)
-    valid[i] &= static_cast<unsigned char>(!(lower > values[i]) & !(values[i] > upper));
-}
 
 GRIDMILL_MULTIVERSION void LimitRow(std::size_t count, double* values) {
   for (std::size_t i = 0; i < count; ++i) {
@@ -72,29 +37,6 @@ GRIDMILL_MULTIVERSION void TrimRow(const Value* values, Value offset, Value fact
                                    double* trimmed) {
   GRIDMILL_INDEPENDENT
   for (std::size_t i = 0; i < count; ++i) trimmed[i] = (values[i] - offset) * factor;
-}
-
-/// Clears the bytes of the samples of a channel that are its background or leave its range, as whole numbers.
-template <class In>
-void KeepChannel(const In* samples, int background, const Range* range, std::size_t count,
-                 unsigned char* valid) {
-  if constexpr (kNarrow<In>) {
-    unsigned char kept[kBlock];
-    if (background >= std::numeric_limits<In>::min() && background <= std::numeric_limits<In>::max()) {
-      kernels::IntegerRange<In> others(static_cast<float>(background), static_cast<float>(background), false);
-      others.inside = false;
-      kernels::SelectRow(samples, others, count, kept);
-      kernels::KeepValid(kept, count, valid);
-    }
-    if (range == nullptr) return;
-    kernels::SelectRow(samples, kernels::IntegerRange<In>(range->lower, range->upper, false), count, kept);
-    kernels::KeepValid(kept, count, valid);
-  } else {
-    int whole[kBlock];
-    kernels::StoreCast(samples, count, whole);
-    KeepOthers(whole, background, count, valid);
-    if (range != nullptr) KeepWithin(whole, *range, count, valid);
-  }
 }
 
 /// Pixels on their way to the bands of the output, at most `kBlock`.
@@ -126,7 +68,7 @@ class BluePixels {
     std::fill_n(valid, count, static_cast<unsigned char>(1));
     if (mask != nullptr) std::copy_n(mask, count, valid);
     for (std::size_t c = 0; c < channels_; ++c)
-      KeepChannel(Channel(c), background_[c], c < 2 ? &ranges_[c] : nullptr, count, valid);
+      kernels::KeepValidSamples(Channel(c), background_[c], c < 2 ? &ranges_[c] : nullptr, count, valid);
     Synthesise();
   }
 
@@ -149,7 +91,7 @@ class BluePixels {
     std::fill_n(blue, count, 0.0);
     if (channels_ >= 3) {
       kernels::SyntheticBlueRow(Channel(0), Channel(1), Channel(2), count, blue);
-      KeepWithin(blue, params_.min[2], params_.max[2], count, valid);
+      kernels::KeepWithin(blue, params_.min[2], params_.max[2], count, valid);
     }
     if (params_.trim) {
       TrimRow<double>(blue, params_.min[2], params_.scale[2], count, blue);
@@ -162,7 +104,7 @@ class BluePixels {
   std::size_t channels_;
   std::vector<std::array<In, kBlock>> planes_;
   std::vector<int> background_;  ///< of each channel, in whole numbers
-  std::vector<Range> ranges_;
+  std::vector<kernels::ValidRange> ranges_;
 };
 
 /// The bands of the pixels as they are written: three, or blue alone.
@@ -191,6 +133,49 @@ void WriteBands(const BluePixels<In>& pixels, const details::BlueParams& params,
   if (triple) kernels::StorePixels(bands, pixels.count, target);
 }
 
+/// The short way of most bytes, from three channels to three bands.
+template <class In, class Out>
+struct ByteWay {
+  ByteWay(const details::BlueParams&, std::size_t, bool) {}
+  bool Write(const frame::FilterBlock<In, Out>&) const { return false; }
+};
+
+template <>
+class ByteWay<unsigned char, unsigned char> {
+ public:
+  ByteWay(const details::BlueParams& params, std::size_t channels, bool triple)
+      : open_(channels == 3 && triple) {
+    if (!open_) return;
+    for (std::size_t c = 0; c < 3; ++c) {
+      rule_.background[c] = tessel::PlainCast<int>(params.backGround[c]);
+      rule_.written[c] = tessel::PlainCast<unsigned char>(params.backGround[c]);
+      if (params.trim) rule_.trim[c] = {params.min[c], params.scale[c]};
+      if (c == 2) continue;
+      rule_.range[c] = kernels::ValidRange(params.min[c], params.max[c]).Of<unsigned char>();
+    }
+    rule_.least = params.min[2];
+    rule_.greatest = params.max[2];
+    rule_.trims = params.trim;
+  }
+
+  /// Returns false, with nothing written, if the pixels have to go the long way.
+  bool Write(const frame::FilterBlock<unsigned char, unsigned char>& block) const {
+    if (!open_) return false;
+    unsigned char planes[3][kBlock], bands[3][kBlock], valid[kBlock];
+    for (std::size_t c = 0; c < 3; ++c)
+      kernels::CopyRow(block.image + c, block.stride, block.pixels, planes[c]);
+    std::fill_n(valid, block.pixels, static_cast<unsigned char>(1));
+    if (block.masked) std::copy_n(block.valid, block.pixels, valid);
+    if (!rule_.Make(planes, valid, block.pixels, bands)) return false;
+    kernels::StorePixels(bands, block.pixels, block.target);
+    return true;
+  }
+
+ private:
+  bool open_;
+  kernels::ByteColours rule_{};
+};
+
 // ---- image
 
 }  // namespace
@@ -202,10 +187,12 @@ class SPOTBlue::InnerProcessor : public filters::IProcessor, public details::Blu
     if (in->height < 1 || in->width < 1) return;
     const bool triple = out->channels == 3;
     BluePixels<In> pixels(*this, in->channels, triple);
+    ByteWay<In, Out> bytes(*this, in->channels, triple);
     const std::size_t read = BluePixels<In>::SamplesRead(in->channels, triple);
     const std::size_t written = triple ? 3 : 1;
     const frame::FilterShape shape{kBlock, frame::Walk::kPixels, written, frame::Walk::kPixels, read};
     frame::FilterRows<In, Out>(*in, mask, *out, shape, [&](const auto& block) {
+      if (bytes.Write(block)) return;
       pixels.Load(block.image, block.stride, block.pixels, block.masked ? block.valid : nullptr);
       WriteBands(pixels, *this, triple, block.target);
     });

@@ -11,21 +11,20 @@ namespace {
 /// Pixels that are estimated together.
 constexpr std::size_t kEstimated = 128;
 
-/// The bins of bytes by an estimate in `float`. Returns false if an estimate is so near to a whole number
-/// that the exact blue may lie on its other side; its error is below 16 units of 2^-24 of 256.
+/// The bins of bytes by an estimate. Returns false if one is so near to a whole number that the exact blue
+/// may lie on its other side.
 GRIDMILL_MULTIVERSION bool EstimatedBinRow(const unsigned char* __restrict s0,
                                            const unsigned char* __restrict s1,
                                            const unsigned char* __restrict s2, std::size_t count,
                                            unsigned char* __restrict bins) {
-  constexpr float error = 0x1p-12f;
   int near = 0;
   for (std::size_t i = 0; i < count; ++i) {
-    const float b = s0[i] * 0.873393f + 13.9054f - s1[i] * 0.138254f - s2[i] * 0.100616f;
+    const float b = EstimatedBlue(s0[i], s1[i], s2[i]);
     const int whole = static_cast<int>(b);
     const float fraction = b - static_cast<float>(whole);
     // Of a negative blue, which has bin 0, the fraction is negative or 0.
-    near |= static_cast<int>(fraction >= -error) & static_cast<int>(fraction < error);
-    near |= static_cast<int>(fraction > 1.0f - error);
+    near |= static_cast<int>(fraction >= -kEstimateError) & static_cast<int>(fraction < kEstimateError);
+    near |= static_cast<int>(fraction > 1.0f - kEstimateError);
     bins[i] = static_cast<unsigned char>(whole < 0 ? 0 : whole);
   }
   return near == 0;

@@ -19,6 +19,8 @@ struct IntegerRange {
   bool inside;  ///< false: 1 for all others
   bool empty;   ///< no sample from `first` on
 
+  IntegerRange() = default;
+
   /// The range from `lower` to `upper`, both included, or the one that wraps around. NaN bounds nothing.
   IntegerRange(float lower, float upper, bool wraps) {
     constexpr int least = std::numeric_limits<Sample>::min(), most = std::numeric_limits<Sample>::max();
