@@ -50,11 +50,12 @@ int RegisterRow(const Row& row, const Size& size, bool quick, const std::regex& 
 int RegisterRows(bool quick, const std::regex& filter) {
   int registered = 0;
   for (const auto rows :
-       {FilterSlpRows(),       FilterAspRows(),        AverageChannelsRows(), SingleChangeRows(),
-        ChanDiffChangeRows(),  ChanDiffChange2Rows(),  ChanRatioChangeRows(), ChanRatioChange2Rows(),
-        CombChangeRows(),      IntenRatioChangeRows(), MagnitudeChangeRows(), TasseledCapChangeRows(),
-        VegIndexRows(),        NormalizeRows(),        PercentileRows(),      IntenPercentRows(),
-        BitmapFilteringRows(), MirrorImgRows(),        SqrGradientRows(),     VollathRows()})
+       {FilterSlpRows(),        FilterAspRows(),        AverageChannelsRows(), SingleChangeRows(),
+        ChanDiffChangeRows(),   ChanDiffChange2Rows(),  ChanRatioChangeRows(), ChanRatioChange2Rows(),
+        CombChangeRows(),       IntenRatioChangeRows(), MagnitudeChangeRows(), TasseledCapChangeRows(),
+        VegIndexRows(),         NormalizeRows(),        PercentileRows(),      IntenPercentRows(),
+        BitmapFilteringRows(),  MirrorImgRows(),        SqrGradientRows(),     VollathRows(),
+        RasterStatisticsRows(), RangeClassesRows(),     IIIDataTransferRows(), SPOTBlueRows()})
     for (const Row& row : rows)
       for (const Size& size : kSizes) registered += RegisterRow(row, size, quick, filter);
   return registered;

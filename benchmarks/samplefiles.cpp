@@ -32,6 +32,7 @@ class SampleFile {
 void WriteSample(const Row& row, const std::string& folder) {
   const Workload work = row.workload(kSampleEdge);
   row.gridmill(work);
+  if (row.results != nullptr) row.results(work);
   const std::string path = folder + "/" + row.python;
   SampleFile(path + ".in").Write(work.in->data, work.in->dataSize);
   SampleFile(path + ".out").Write(work.out->data, work.out->dataSize);

@@ -161,11 +161,21 @@ Workload MakeWorkload(std::uint32_t size, std::uint32_t inChannels, std::uint32_
   return workload;
 }
 
+template <class In>
+Workload MakeScene(const tessel::RasterInfo& inInfo, const tessel::RasterInfo& outInfo) {
+  Workload workload;
+  workload.in = std::make_unique<tessel::Raster>(inInfo, tessel::RasterContext());
+  workload.out = std::make_unique<tessel::Raster>(outInfo, tessel::RasterContext());
+  workload.twin = std::make_unique<tessel::Raster>(outInfo, tessel::RasterContext());
+  FillScene<In>(*workload.in);
+  return workload;
+}
+
 }  // namespace
 
 std::size_t Workload::BytesMoved() const {
   return ImageBytes(*in) + (reference != nullptr ? ImageBytes(*reference) : 0) + ImageBytes(*out) +
-         (mask != nullptr ? mask->bits.size() : 0);
+         (mask != nullptr ? mask->bits.size() : 0) - untouched;
 }
 
 template <class In, class Out, std::uint32_t channels, MaskPattern pattern>
@@ -219,13 +229,25 @@ Workload RankedScene(std::uint32_t size) {
 
 template <class In, std::uint32_t channels, std::uint32_t sums>
 Workload SummedScene(std::uint32_t size) {
-  const tessel::RasterInfo inInfo(size, size, channels, tessel::DataType::Of<In>());
-  const tessel::RasterInfo outInfo(1, 1, sums, tessel::DataType::Of<double>());
-  Workload workload;
-  workload.in = std::make_unique<tessel::Raster>(inInfo, tessel::RasterContext());
-  workload.out = std::make_unique<tessel::Raster>(outInfo, tessel::RasterContext());
-  workload.twin = std::make_unique<tessel::Raster>(outInfo, tessel::RasterContext());
-  FillScene<In>(*workload.in);
+  return MakeScene<In>({size, size, channels, tessel::DataType::Of<In>()},
+                       {1, 1, sums, tessel::DataType::Of<double>()});
+}
+
+template <class In, std::uint32_t channels, std::uint32_t bins>
+Workload CountedScene(std::uint32_t size) {
+  Workload workload = MakeScene<In>({size, size, channels, tessel::DataType::Of<In>()},
+                                    {1, 1, channels * (2 + bins), tessel::DataType::Of<int>()});
+  workload.untouched = ImageBytes(*workload.out);
+  return workload;
+}
+
+template <class In, class Out, std::uint32_t channels, std::uint32_t from, std::uint32_t to>
+Workload ScaledScene(std::uint32_t size) {
+  const std::uint32_t inSize = size * from / to;
+  Workload workload = MakeScene<In>({inSize, inSize, channels, tessel::DataType::Of<In>()},
+                                    {size, size, channels, tessel::DataType::Of<Out>()});
+  const std::uint32_t skippedRows = inSize > size ? inSize - size : 0;
+  workload.untouched = ImageBytes(*workload.in) / inSize * skippedRows;
   return workload;
 }
 
@@ -263,9 +285,11 @@ template Workload Dates<unsigned short, unsigned short, float, 6, 3, MaskPattern
 template Workload Dates<short, unsigned short, float, 1, 1, MaskPattern::kNone>(std::uint32_t);
 template Workload Dates<float, float, float, 1, 1, MaskPattern::kNone>(std::uint32_t);
 template Workload Scene<unsigned char, unsigned char, 3, 3>(std::uint32_t);
+template Workload Scene<unsigned short, unsigned char, 1, 1>(std::uint32_t);
 template Workload Scene<unsigned short, float, 3, 3>(std::uint32_t);
 template Workload Scene<unsigned short, float, 4, 1>(std::uint32_t);
 template Workload Scene<unsigned short, float, 7, 12>(std::uint32_t);
+template Workload Scene<float, unsigned char, 1, 1>(std::uint32_t);
 template Workload Scene<float, float, 1, 1>(std::uint32_t);
 template Workload RankedScene<unsigned short, unsigned char, 3, 3>(std::uint32_t);
 template Workload RankedScene<float, float, 1, 1>(std::uint32_t);
@@ -277,6 +301,11 @@ template Workload SummedScene<float, 1, 1>(std::uint32_t);
 template Workload SummedScene<float, 1, 2>(std::uint32_t);
 template Workload SummedScene<float, 4, 4>(std::uint32_t);
 template Workload SummedScene<float, 4, 8>(std::uint32_t);
+template Workload CountedScene<unsigned char, 3, 256>(std::uint32_t);
+template Workload CountedScene<unsigned short, 1, 65536>(std::uint32_t);
+template Workload ScaledScene<unsigned char, unsigned char, 3, 1, 2>(std::uint32_t);
+template Workload ScaledScene<unsigned short, unsigned short, 4, 3, 2>(std::uint32_t);
+template Workload ScaledScene<unsigned short, float, 4, 3, 2>(std::uint32_t);
 template Workload Speckle<unsigned short, unsigned char, MaskPattern::kNone>(std::uint32_t);
 template Workload Speckle<unsigned short, unsigned char, MaskPattern::kRandom>(std::uint32_t);
 template Workload Speckle<unsigned short, unsigned char, MaskPattern::kRuns>(std::uint32_t);

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <any>
 #include <cstddef>
 #include <cstdint>
 #include <memory>
@@ -27,9 +28,10 @@ struct Workload {
   std::unique_ptr<tessel::Mask> mask;         ///< null: every pixel is valid
   std::unique_ptr<tessel::Raster> out;
   std::unique_ptr<tessel::Raster> twin;
-  Histogram histogram;  ///< of `in`; empty: the job needs none
-
-  std::size_t Pixels() const { return std::size_t{in->width} * in->height; }
+  Histogram histogram;        ///< of `in`; empty: the job needs none
+  std::size_t untouched = 0;  ///< bytes of `in` and `out` that a pass has no need to move
+  mutable std::any kept;      ///< what gridmill keeps from call to call; empty before the first
+  mutable std::any keptTwin;  ///< the same of the naive twin
 
   /// Bytes that a pass has to move: the image areas of inputs and output, and the mask's bits.
   std::size_t BytesMoved() const;
@@ -50,6 +52,18 @@ inline constexpr float kStretchTo[] = {21000.0f, 21500.0f, 22000.0f};
 /// Half of the samples of `Speckle`, from field to field and from pixel to pixel.
 inline constexpr float kRangeFrom = 13500.0f;
 inline constexpr float kRangeTo = 20500.0f;
+
+/// Eight classes over the samples of `Scene`: three pairs overlap, the others share a bound. No-data is rare.
+inline constexpr float kClassFrom[] = {5000, 9000, 12000, 14000, 16500, 18500, 21000, 24000};
+inline constexpr float kClassTo[] = {9000, 12000, 14500, 17000, 18500, 21500, 24000, 32000};
+inline constexpr float kClassNoData = 17000.0f;
+
+/// The ranges of green, red and blue that all but a few pixels in a hundred of `Scene` in 8 bits keep within,
+/// the factors that stretch them to 255, and the scene's own background, a tenth of the image.
+inline constexpr float kBlueMin[] = {60.0f, 72.0f, 48.0f};
+inline constexpr float kBlueMax[] = {204.0f, 193.0f, 148.0f};
+inline constexpr float kBlueScale[] = {255.0f / 144.0f, 255.0f / 121.0f, 255.0f / 100.0f};
+inline constexpr float kBlueBackground[] = {0.0f, 0.0f, 0.0f};
 
 /// Hills of three wavelengths with a little noise, slopes from 0 to 60 degrees, and a margin of 1. The output
 /// has as many channels.
@@ -80,6 +94,16 @@ Workload RankedScene(std::uint32_t size);
 template <class In, std::uint32_t channels, std::uint32_t sums>
 Workload SummedScene(std::uint32_t size);
 
+/// The same scene for jobs that count samples: the output is, for each channel, one `int` for each of `bins`
+/// bins behind two for minimum and maximum. No call has to write it.
+template <class In, std::uint32_t channels, std::uint32_t bins>
+Workload CountedScene(std::uint32_t size);
+
+/// The same scene for jobs that change the scale: `from` input pixels along each axis for `to` of the output,
+/// whose edge is `size`.
+template <class In, class Out, std::uint32_t channels, std::uint32_t from, std::uint32_t to>
+Workload ScaledScene(std::uint32_t size);
+
 /// Noise from 10000 to 24000 on waves of up to 5000, in one channel.
 template <class In, class Out, MaskPattern pattern = MaskPattern::kNone>
 Workload Speckle(std::uint32_t size);
@@ -91,10 +115,11 @@ inline bool IsValid(const tessel::Mask& mask, std::size_t x, std::size_t y) {
 }
 
 /// A value as a byte: rounded and clamped.
-inline unsigned char ToByte(float value) {
-  const float rounded = value + 0.5f;
-  if (rounded >= 255.0f) return 255;
-  if (rounded <= 0.0f) return 0;
+template <class Value>
+unsigned char ToByte(Value value) {
+  const Value rounded = value + Value{0.5};
+  if (rounded >= Value{255}) return 255;
+  if (rounded <= Value{0}) return 0;
   return static_cast<unsigned char>(rounded);
 }
 

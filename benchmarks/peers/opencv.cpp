@@ -1,6 +1,8 @@
 #include <algorithm>
 #include <array>
 #include <cstring>
+#include <iterator>
+#include <vector>
 
 #include <opencv2/core.hpp>
 #include <opencv2/imgproc.hpp>
@@ -20,7 +22,10 @@ constexpr int kUnlikeDifferenceStrip = 32;
 constexpr int kDecibelsPixels = 65536;
 constexpr int kNdviPixels = 32768;
 constexpr int kStretchPixels = 16384;
-constexpr int kBitmapPixels = 65536;
+/// Bitmaps, classes and natural colours.
+constexpr int kConstantPixels = 65536;
+/// Rows of the output, for 1.5 rows of the input each.
+constexpr int kNearestStrip = 64;
 /// A single call does best with all rows at once.
 constexpr int kAllRows = 1 << 30;
 
@@ -79,13 +84,13 @@ struct StretchConstants {
   }
 };
 
-/// A strip of one value, for `inRange` and `bitwise_and`, which are slower with scalars.
+/// A strip of one pixel, for `inRange`, `compare` and `bitwise_and`, which are slower with scalars.
 struct Constant {
   cv::Mat values;
 
-  Constant(int type, double value) : values(1, kBitmapPixels, type, cv::Scalar(value)) {}
+  Constant(int type, const cv::Scalar& value) : values(1, kConstantPixels, type, value) {}
   cv::Mat As(const cv::Mat& strip) const {
-    return values.colRange(0, strip.rows * strip.cols).reshape(1, strip.rows);
+    return values.colRange(0, strip.rows * strip.cols).reshape(values.channels(), strip.rows);
   }
 };
 
@@ -114,6 +119,51 @@ void Flip(const Workload& work, int axis) {
   [[maybe_unused]] static const bool serial = (cv::setNumThreads(1), true);
   cv::Mat target = View(*work.twin, 0, 0, static_cast<int>(work.in->height));
   cv::flip(View(*work.in, 0, 0, static_cast<int>(work.in->height)), target, axis);
+}
+
+/// The counts of one channel go to a place in `twin`.
+void CountSamples(const Workload& work, int channel, int bins) {
+  [[maybe_unused]] static const bool serial = (cv::setNumThreads(1), true);
+  const cv::Mat image = View(*work.in, 0, 0, static_cast<int>(work.in->height));
+  const float range[] = {0.0f, static_cast<float>(bins)};
+  const float* ranges[] = {range};
+  cv::Mat counts(bins, 1, CV_32F, RowOf<float>(*work.twin, 0) + channel * bins);
+  cv::calcHist(&image, 1, &channel, cv::Mat(), counts, 1, &bins, ranges);
+}
+
+/// The bounds, the numbers and the no-data value of the classes, for one type of samples.
+struct ClassConstants {
+  struct Class {
+    Constant from, to, number;
+  };
+  std::vector<Class> classes;
+  Constant noData;
+
+  explicit ClassConstants(int type) : noData(type, kClassNoData) {
+    for (std::size_t k = 0; k < std::size(kClassFrom); ++k)
+      classes.push_back({{type, kClassFrom[k]}, {type, kClassTo[k]}, {CV_8U, static_cast<double>(k + 1)}});
+  }
+};
+
+/// The ranges of the bands' samples; background is below them.
+struct ColourConstants {
+  Constant from{CV_8UC3, {kBlueMin[0], kBlueMin[1], 1.0}};
+  Constant to{CV_8UC3, {kBlueMax[0], kBlueMax[1], 255.0}};
+};
+
+/// The colours of a strip by one product of matrices, then the pixels whose samples leave their ranges. The
+/// strips of bounds are prepared once and not counted.
+void MixColours(const Workload& work, const cv::Matx34f& mix) {
+  static const ColourConstants constants;
+  cv::Mat colours, valid, validSamples;
+  ForEachStrip(work, RowsOf(work, kConstantPixels), [&](int y, int rows) {
+    const cv::Mat source = View(*work.in, 0, y, rows);
+    cv::transform(source, colours, mix);
+    cv::inRange(source, constants.from.As(source), constants.to.As(source), valid);
+    cv::cvtColor(valid, validSamples, cv::COLOR_GRAY2BGR);
+    cv::Mat target = View(*work.twin, 0, y, rows);
+    cv::bitwise_and(colours, validSamples, target);
+  });
 }
 
 }  // namespace
@@ -243,7 +293,7 @@ void OpenCvStretch(const Workload& work) {
 void OpenCvBitmap(const Workload& work) {
   static const RangeConstants constants;
   cv::Mat inside;
-  ForEachStrip(work, RowsOf(work, kBitmapPixels), [&](int y, int rows) {
+  ForEachStrip(work, RowsOf(work, kConstantPixels), [&](int y, int rows) {
     const cv::Mat source = View(*work.in, 0, y, rows);
     cv::inRange(source, constants.from.As(source), constants.to.As(source), inside);
     cv::Mat target = View(*work.twin, 0, y, rows);
@@ -255,7 +305,7 @@ void OpenCvBitmap(const Workload& work) {
 void OpenCvMaskedBitmap(const Workload& work) {
   static const RangeConstants constants;
   cv::Mat inside, valid;
-  ForEachStrip(work, RowsOf(work, kBitmapPixels), [&](int y, int rows) {
+  ForEachStrip(work, RowsOf(work, kConstantPixels), [&](int y, int rows) {
     const cv::Mat source = View(*work.in, 0, y, rows);
     cv::inRange(source, constants.from.As(source), constants.to.As(source), inside);
     UnpackBits(*work.mask, y, rows, valid);
@@ -274,6 +324,66 @@ void OpenCvSquaredGradient(const Workload& work) {
   const cv::Mat upper = View(*work.in, 0, 0, pairs);
   const cv::Mat lower = View(*work.in, 0, 1, pairs);
   *RowOf<double>(*work.twin, 0) = cv::norm(upper, lower, cv::NORM_L2SQR);
+}
+
+/// The channels as they lie in the pixels: splitting costs more than it saves.
+void OpenCvHistograms(const Workload& work) {
+  for (int c = 0; c < 3; ++c) CountSamples(work, c, 256);
+}
+
+void OpenCvWideHistogram(const Workload& work) { CountSamples(work, 0, 65536); }
+
+/// The greatest of the classes' numbers, each 0 outside its class: faster than `setTo` with a mask. Samples
+/// of both types are compared faster than `inRange` takes those of 32 bits. The strips of bounds are prepared
+/// once and not counted.
+void OpenCvClasses(const Workload& work) {
+  static const ClassConstants ofShorts(CV_16U), ofFloats(CV_32F);
+  const ClassConstants& constants = work.in->dataType.isFloat ? ofFloats : ofShorts;
+  cv::Mat above, inside;
+  ForEachStrip(work, RowsOf(work, kConstantPixels), [&](int y, int rows) {
+    const cv::Mat source = View(*work.in, 0, y, rows);
+    cv::Mat target = View(*work.twin, 0, y, rows);
+    target.setTo(0);
+    for (const ClassConstants::Class& one : constants.classes) {
+      cv::compare(source, one.from.As(source), above, cv::CMP_GT);
+      cv::compare(source, one.to.As(source), inside, cv::CMP_LT);
+      cv::bitwise_and(above, inside, inside);
+      cv::bitwise_and(inside, one.number.As(source), inside);
+      cv::max(target, inside, target);
+    }
+    cv::compare(source, constants.noData.As(source), inside, cv::CMP_NE);
+    cv::bitwise_and(target, inside, target);
+  });
+}
+
+void OpenCvNearest(const Workload& work) {
+  [[maybe_unused]] static const bool serial = (cv::setNumThreads(1), true);
+  cv::Mat target = View(*work.twin, 0, 0, static_cast<int>(work.twin->height));
+  cv::resize(View(*work.in, 0, 0, static_cast<int>(work.in->height)), target, target.size(), 0.0, 0.0,
+             cv::INTER_NEAREST);
+}
+
+/// From 1.5 rows to one, then to the output's type.
+void OpenCvConvertedNearest(const Workload& work) {
+  cv::Mat nearest;
+  ForEachStrip(work, kNearestStrip * 3 / 2, [&](int y, int rows) {
+    cv::Mat target = View(*work.twin, 0, y * 2 / 3, rows * 2 / 3);
+    cv::resize(View(*work.in, 0, y, rows), nearest, target.size(), 0.0, 0.0, cv::INTER_NEAREST);
+    nearest.convertTo(target, CV_32F);
+  });
+}
+
+void OpenCvNaturalColour(const Workload& work) {
+  MixColours(work, {0.0f, 1.0f, 0.0f, 0.0f,  //
+                    1.0f, 0.0f, 0.0f, 0.0f,  //
+                    0.873393f, -0.138254f, -0.100616f, 13.9054f});
+}
+
+void OpenCvTrimmedNaturalColour(const Workload& work) {
+  const auto [green, red, blue] = kBlueScale;
+  MixColours(work, {0.0f, red, 0.0f, -kBlueMin[1] * red,      //
+                    green, 0.0f, 0.0f, -kBlueMin[0] * green,  //
+                    0.873393f * blue, -0.138254f * blue, -0.100616f * blue, (13.9054f - kBlueMin[2]) * blue});
 }
 
 }  // namespace orvik::bench

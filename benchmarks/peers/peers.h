@@ -26,6 +26,14 @@ GRIDMILL_PEER void OpenCvMirrorColumns(const Workload& work);
 GRIDMILL_PEER void OpenCvMirrorRows(const Workload& work);
 GRIDMILL_PEER void OpenCvSquaredGradient(const Workload& work);
 
+GRIDMILL_PEER void OpenCvHistograms(const Workload& work);
+GRIDMILL_PEER void OpenCvWideHistogram(const Workload& work);
+GRIDMILL_PEER void OpenCvClasses(const Workload& work);
+GRIDMILL_PEER void OpenCvNearest(const Workload& work);
+GRIDMILL_PEER void OpenCvConvertedNearest(const Workload& work);
+GRIDMILL_PEER void OpenCvNaturalColour(const Workload& work);
+GRIDMILL_PEER void OpenCvTrimmedNaturalColour(const Workload& work);
+
 GRIDMILL_PEER void GdalSlope(const Workload& work);
 GRIDMILL_PEER void GdalAspect(const Workload& work);
 

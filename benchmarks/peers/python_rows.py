@@ -30,6 +30,12 @@ STRETCH_FROM = (13000, 12500, 12000)
 STRETCH_TO = (21000, 21500, 22000)
 RANGE_FROM = 13500
 RANGE_TO = 20500
+CLASS_FROM = np.array((5000, 9000, 12000, 14000, 16500, 18500, 21000, 24000), np.float32)
+CLASS_TO = np.array((9000, 12000, 14500, 17000, 18500, 21500, 24000, 32000), np.float32)
+CLASS_NO_DATA = np.float32(17000)
+BLUE_MIN = np.array((60, 72, 48), np.float32)
+BLUE_MAX = np.array((204, 193, 148), np.float32)
+BLUE_SCALE = np.array((255 / 144, 255 / 121, 255 / 100), np.float32)
 
 # Pixels that go through the steps of numpy together, so that what lies between them stays in the cache.
 NUMPY_STRIP = 65536
@@ -39,17 +45,25 @@ compiled = numba.njit(error_model="numpy")
 
 
 class Job:
-    """The data of a row: `source` and `target` as flat samples, `mask` as packed bits or None."""
+    """The data of a row: `source` and `target` as flat samples, `mask` as packed bits or None.
+
+    Rows without an output have integers as results, as many as gridmill has.
+    """
 
     def __init__(self, folder, name, types, size):
-        given, wanted = (parse_type(text) for text in types.split(" -> "))
+        given, *wanted = (parse_type(text) for text in types.split(" -> "))
         path = os.path.join(folder, name)
         self.tiles = size // SAMPLE_EDGE
         self.pixels = size * size
         self.channels = given[1]
         self.source = self.lay(np.fromfile(path + ".in", given[0]).reshape(SAMPLE_EDGE, -1))
-        self.expected = np.fromfile(path + ".out", wanted[0])
-        self.target = np.zeros(self.pixels * wanted[1], wanted[0])
+        if wanted:
+            ((sample_type, channels),) = wanted
+            self.expected = np.fromfile(path + ".out", sample_type)
+            self.target = np.zeros(self.pixels * channels, sample_type)
+        else:
+            self.expected = np.fromfile(path + ".out", np.int32)
+            self.target = np.zeros_like(self.expected)
         self.mask = None
         if os.path.exists(path + ".mask"):
             self.mask = self.lay(np.fromfile(path + ".mask", np.uint8).reshape(SAMPLE_EDGE, -1))
@@ -201,6 +215,76 @@ def compute_indices(source, target):
         target[o + 11] = ((n - g) * 1.2 - (r - g) * 2.5) * 1.2
 
 
+@compiled
+def count(source, results):
+    """Least, greatest and the counts, over all calls."""
+    least, greatest = results[0], results[1]
+    counts = results[2:]
+    for sample in source:
+        counts[sample] += 1
+        least = min(least, np.int32(sample))
+        greatest = max(greatest, np.int32(sample))
+    results[0], results[1] = least, greatest
+
+
+@compiled
+def classify(source, target):
+    for i in range(source.size):
+        s = source[i]
+        number = np.uint8(0)
+        for k in range(8):
+            number = np.uint8(k + 1) if (s > CLASS_FROM[k]) & (CLASS_TO[k] > s) else number
+        target[i] = np.uint8(0) if s == CLASS_NO_DATA else number
+
+
+@compiled
+def look_up_classes(source, target, table):
+    for i in range(source.size):
+        target[i] = table[source[i]]
+
+
+@compiled
+def blue_of(s0, s1, s2):
+    return ((s0 * 0.873393 + 13.9054) - s1 * 0.138254) - s2 * 0.100616
+
+
+@compiled
+def bits_of_valid(s0, s1, s2, blue):
+    """All bits or none; the background is 0 in all channels."""
+    valid = (s0 >= BLUE_MIN[0]) & (s0 <= BLUE_MAX[0]) & (s1 >= BLUE_MIN[1]) & (s1 <= BLUE_MAX[1])
+    valid &= (s0 != 0) & (s1 != 0) & (s2 != 0) & (blue >= BLUE_MIN[2]) & (blue <= BLUE_MAX[2])
+    return np.int32(-1) if valid else np.int32(0)
+
+
+@compiled
+def rounded(value):
+    return min(max(np.int32(np.float64(value) + 0.5), np.int32(0)), np.int32(255))
+
+
+@compiled
+def mix_colours(source, target):
+    """Without a branch: so the compiler vectorises it."""
+    for i in range(source.size // 3):
+        s0, s1, s2 = np.int32(source[3 * i]), np.int32(source[3 * i + 1]), np.int32(source[3 * i + 2])
+        blue = blue_of(s0, s1, s2)
+        bits = bits_of_valid(s0, s1, s2, blue)
+        target[3 * i] = s1 & bits
+        target[3 * i + 1] = s0 & bits
+        target[3 * i + 2] = rounded(min(max(blue, 0.0), 255.0)) & bits
+
+
+@compiled
+def stretch_colours(source, target):
+    for i in range(source.size // 3):
+        s0, s1, s2 = np.int32(source[3 * i]), np.int32(source[3 * i + 1]), np.int32(source[3 * i + 2])
+        blue = blue_of(s0, s1, s2)
+        bits = bits_of_valid(s0, s1, s2, blue)
+        target[3 * i] = rounded((np.float32(s1) - BLUE_MIN[1]) * BLUE_SCALE[1]) & bits
+        target[3 * i + 1] = rounded((np.float32(s0) - BLUE_MIN[0]) * BLUE_SCALE[0]) & bits
+        blue = (blue - np.float64(BLUE_MIN[2])) * np.float64(BLUE_SCALE[2])
+        target[3 * i + 2] = rounded(blue) & bits
+
+
 def numba_percentile_bytes(job):
     tables = np.array([spline.byte_of_each_sample() for spline in job.splines()])
     source, target = job.source.reshape(-1, 3), job.target.reshape(-1, 3)
@@ -251,6 +335,29 @@ def numba_indices(job):
     return lambda: compute_indices(job.source, job.target)
 
 
+def numba_statistics(job):
+    job.target[:2] = 100000, -100000
+    return lambda: count(job.source, job.target)
+
+
+def numba_classes_of_floats(job):
+    return lambda: classify(job.source, job.target)
+
+
+def numba_classes_of_shorts(job):
+    table = np.empty(65536, np.uint8)
+    classify(np.arange(65536, dtype=np.float32), table)
+    return lambda: look_up_classes(job.source, job.target, table)
+
+
+def numba_natural_colour(job):
+    return lambda: mix_colours(job.source, job.target)
+
+
+def numba_natural_colour_trim(job):
+    return lambda: stretch_colours(job.source, job.target)
+
+
 BITMAP_PEERS = {"numpy": numpy_bitmap, "numba": numba_bitmap}
 # The rows by the name that they have in the program: for each peer what makes its call.
 PEERS = {
@@ -261,6 +368,11 @@ PEERS = {
     "bitmap": BITMAP_PEERS,
     "bitmap_random_mask": BITMAP_PEERS,
     "bitmap_mask_in_runs": BITMAP_PEERS,
+    "statistics": {"numba": numba_statistics},
+    "classes_of_floats": {"numba": numba_classes_of_floats},
+    "classes_of_shorts": {"numba": numba_classes_of_shorts},
+    "natural_colour": {"numba": numba_natural_colour},
+    "natural_colour_trim": {"numba": numba_natural_colour_trim},
 }
 
 
