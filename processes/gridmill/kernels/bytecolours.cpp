@@ -22,16 +22,20 @@ struct BlueRule {
 /// How far the estimates of a row stay away from where the exact blue could decide otherwise. Distances are
 /// kept as the bits of positive numbers, which have the numbers' order.
 struct Distances {
-  std::int32_t limit = std::numeric_limits<std::int32_t>::max();  ///< of the valid range
-  std::int32_t whole =
-      std::numeric_limits<std::int32_t>::max();  ///< of a whole number, where rounding changes
+  static constexpr std::int32_t kFar = std::numeric_limits<std::int32_t>::max();
+  std::int32_t limit = kFar;  ///< of the valid range
+  std::int32_t half = kFar;   ///< between two whole numbers, where rounding turns
 };
 
 GRIDMILL_INLINE std::int32_t BitsOf(float distance) {
   return std::bit_cast<std::int32_t>(std::fabs(distance));
 }
 
+/// A sum with it is a whole number, the nearest one, whose low bits are the integer's.
+constexpr float kWhole = 0x1.8p23f;
+
 /// Blue as bytes, and 1 where it is valid.
+template <bool trims>
 GRIDMILL_MULTIVERSION Distances EstimateRow(const unsigned char* __restrict s0,
                                             const unsigned char* __restrict s1,
                                             const unsigned char* __restrict s2, BlueRule rule,
@@ -43,14 +47,14 @@ GRIDMILL_MULTIVERSION Distances EstimateRow(const unsigned char* __restrict s0,
     const float outside = std::fabs(b - rule.middle) - rule.halfWidth;
     within[i] = static_cast<unsigned char>(outside <= 0.0f);
     least.limit = std::min(least.limit, BitsOf(outside));
-    // 0.5 is added to round. Beyond the limits of a byte all is certain.
-    const float rounded = (b - rule.trim.offset) * rule.trim.factor + 0.5f;
-    const float above = rounded > -0.5f ? rounded : -0.5f;
-    const float held = above < 255.5f ? above : 255.5f;
-    const int whole = static_cast<int>(held);
-    const float fraction = held - static_cast<float>(whole);
-    least.whole = std::min(least.whole, BitsOf(0.5f - std::fabs(fraction - 0.5f)));
-    blue[i] = static_cast<unsigned char>(whole);
+    // Beyond the limits of a byte all is certain.
+    const float trimmed = trims ? (b - rule.trim.offset) * rule.trim.factor : b;
+    const float above = trimmed > 0.0f ? trimmed : 0.0f;
+    const float held = above < 255.0f ? above : 255.0f;
+    const float sum = held + kWhole;
+    const float fraction = held - (sum - kWhole);
+    least.half = std::min(least.half, BitsOf(0.5f - std::fabs(fraction)));
+    blue[i] = static_cast<unsigned char>(std::bit_cast<std::int32_t>(sum));
   }
   return least;
 }
@@ -143,8 +147,9 @@ bool ByteColours::Make(const unsigned char (*planes)[kBlock], unsigned char* val
 
   unsigned char within[kBlock], trimmed[2][kBlock];
   const BlueRule rule = RuleOf(least, greatest, blue);
-  const Distances near = EstimateRow(planes[0], planes[1], planes[2], rule, count, bands[2], within);
-  if (near.limit <= BitsOf(limitError) || near.whole <= BitsOf(error)) return false;
+  const auto estimate = trims ? EstimateRow<true> : EstimateRow<false>;
+  const Distances near = estimate(planes[0], planes[1], planes[2], rule, count, bands[2], within);
+  if (near.limit <= BitsOf(limitError) || near.half <= BitsOf(error)) return false;
   JudgeRow(planes[0], planes[1], planes[2], rules, within, count, valid);
   if (trims) TrimRow(planes[0], planes[1], trim, count, trimmed[0], trimmed[1]);
   SelectRow(valid, trims ? trimmed[0] : planes[0], trims ? trimmed[1] : planes[1], written, count, bands[0],

@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <cstring>
+#include <limits>
 #include <utility>
 
 #include "processes/gridmill/kernels/multiversion.h"
@@ -88,7 +89,7 @@ PixelGather::PixelGather(std::vector<std::uint32_t> columns, std::size_t pixelBy
 
 void PixelGather::PrepareChunks(std::size_t rowPixels) {
   const std::size_t rowBytes = rowPixels * pixelBytes_;
-  if (rowBytes < 16 || pixelBytes_ >= 8) return;
+  if (rowBytes < 16 || rowBytes > std::numeric_limits<std::uint32_t>::max() || pixelBytes_ >= 8) return;
   const std::size_t bytes = columns_.size() * pixelBytes_;
   chunks_.reserve(bytes / 16);
   for (std::size_t b = 0; b + 16 <= bytes; b += 16) {
