@@ -2,7 +2,6 @@
 // --show 4,3,2 --png out.png
 
 #include <algorithm>
-#include <cmath>
 #include <filesystem>
 #include <limits>
 #include <string>
@@ -43,32 +42,16 @@ struct Scene {
   std::vector<ChannelStatistics> channels;
 };
 
-// Those that were asked for, else the first.
-std::vector<int> ShownPlaces(const StretchOptions& options, const std::vector<int>& bands) {
-  if (options.show.size() == 2)
-    throw Refusal("--show", "two bands make no picture", "three for red, green and blue, or one");
-  std::vector<int> places;
-  for (const int band : options.show) {
-    const auto at = std::find(bands.begin(), bands.end(), band);
-    if (at == bands.end())
-      throw Refusal("--show", "band " + std::to_string(band) + " is not stretched", "one of the --bands");
-    places.push_back(static_cast<int>(at - bands.begin()));
-  }
-  return places.empty() ? std::vector<int>{0} : places;
-}
-
 // Read in single precision, in which the operators compute: the percentile of an integer sample would lose
 // its fraction.
 Scene OpenScene(const StretchOptions& options) {
   examples::DatasetPtr input = OpenInput(options);
   std::vector<int> bands = examples::ChosenBands(options.bands, *input);
-  std::vector<int> shown = ShownPlaces(options, bands);
+  std::vector<int> shown = examples::ShownPlaces(options.show, bands, "stretched");
   examples::TileReader reader({.dataset = *input, .bands = bands, .type = GDT_Float32}, 0, options.tile);
   const bool whole = !examples::IsFloating(examples::RealTypeOf(*input, bands));
-  const auto width = static_cast<std::uint32_t>(input->GetRasterXSize());
-  const auto height = static_cast<std::uint32_t>(input->GetRasterYSize());
   std::vector<ChannelStatistics> channels =
-      StatisticsOf(reader, examples::CutTiles(width, height, options.tile), options.bins,
+      StatisticsOf({.dataset = *input, .bands = bands}, options.tile, options.bins,
                    whole ? examples::Bins::wholeNumbers : examples::Bins::overRange);
   return {std::move(input), std::move(bands), std::move(shown), std::move(reader), std::move(channels)};
 }
@@ -124,23 +107,13 @@ examples::Job JobOf(const StretchOptions& options, const Scene& scene, const Wor
     job.bands.push_back({.name = words.measure + " of band " + std::to_string(band),
                          .unit = "percent",
                          .noData = options.NoDataIf(scene.reader.Masked())});
-  job.shown = static_cast<std::size_t>(scene.shown.front());
   job.style.span = examples::Span::percent;
-  const bool composite = scene.shown.size() == 3;
-  const std::string parts[] = {"red: ", "green: ", "blue: "};
-  std::string bands;
-  for (const int place : scene.shown) {
-    const std::string band = std::to_string(scene.bands[static_cast<std::size_t>(place)]);
-    if (composite)
-      job.style.composite.push_back({place + 1, parts[job.style.composite.size()] + "band " + band});
-    bands += (bands.empty() ? "" : ", ") + band;
-  }
+  const std::string shown = ShowPlaces(job, scene.shown, scene.bands);
   job.style.legend = words.measure;
   job.style.note = words.note;
-  job.style.unit = composite ? "0 to 100 percent" : "percent";
-  job.style.title = !options.title.empty() ? options.title
-                                           : words.title + (composite ? " of bands " : " of band ") + bands +
-                                                 ", " + path.stem().string();
+  job.style.unit = job.style.composite.empty() ? "percent" : "0 to 100 percent";
+  job.style.title =
+      !options.title.empty() ? options.title : words.title + " of " + shown + ", " + path.stem().string();
   job.style.caption = examples::DescribeGrid(path.filename().string(), *scene.input);
   return job;
 }
@@ -187,18 +160,6 @@ void RunNormalize(const StretchOptions& options) {
   Stretch(options, scene, JobOf(options, scene, {"share of range", "Share of the range", note}), normalize);
 }
 
-CLI::Validator Tail() {
-  const CLI::Validator number = examples::Number();
-  return CLI::Validator(
-      [number](std::string& text) {
-        const std::string wrong = number(text);
-        const double value = wrong.empty() ? std::strtod(text.c_str(), nullptr) : 0.0;
-        if (!wrong.empty() || (value >= 0.0 && value < 50.0)) return wrong;
-        return "'" + text + "' is not usable; expected a number from 0 to below 50";
-      },
-      "");
-}
-
 void AddStretchOptions(CLI::App& command, StretchOptions& options, const std::string& notes) {
   AddJobOptions(
       command, options,
@@ -208,14 +169,7 @@ void AddStretchOptions(CLI::App& command, StretchOptions& options, const std::st
           "data.\n");
   examples::AddBandList(command, "--bands", options.bands,
                         "bands to stretch, as in 1,2,3; default: all but alpha bands");
-  command
-      .add_option("--show", options.show,
-                  "the bands in the picture and in the printed figures: three\n"
-                  "as red, green and blue, or one; default: the first")
-      ->type_name("R,G,B")
-      ->delimiter(',')
-      ->expected(1, 3)
-      ->check(examples::Count(1u << 16));
+  examples::AddShow(command, options.show);
   command
       .add_option("--bins", options.bins,
                   "bins of the histograms at most, 256 by default. Integers get\n"
@@ -245,7 +199,7 @@ int main(int argc, char** argv) {
                    "leave out this percentage of the samples at each end when the\n"
                    "range is measured, in whole bins; default 0")
       ->type_name("P")
-      ->check(Tail());
+      ->check(examples::Tail());
   return examples::RunProgram(app, argc, argv,
                               [&] { percentile->parsed() ? RunPercentile(options) : RunNormalize(options); });
 }

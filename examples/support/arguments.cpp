@@ -29,12 +29,13 @@ CLI::Validator NumberWith(const std::string& expected, bool (*accept)(double)) {
 
 }  // namespace
 
-CLI::Validator Count(std::uint32_t last) {
-  const auto check = [last](const std::string& text) {
+CLI::Validator Count(std::uint32_t last, std::uint32_t first) {
+  const auto check = [last, first](const std::string& text) {
     double value = 0.0;
-    if (ParseNumber(text, value) && value == std::floor(value) && value >= 1.0 && value <= last)
+    if (ParseNumber(text, value) && value == std::floor(value) && value >= first && value <= last)
       return std::string();
-    return "'" + text + "' is not usable; expected a whole number from 1 to " + std::to_string(last);
+    return "'" + text + "' is not usable; expected a whole number from " + std::to_string(first) + " to " +
+           std::to_string(last);
   };
   return CLI::Validator(check, "");
 }
@@ -65,6 +66,21 @@ CLI::Validator OneOf(const std::vector<std::string>& names) {
   return CLI::Validator(check, "");
 }
 
+CLI::Validator Tail() {
+  return NumberWith("a number from 0 to below 50", [](double value) { return value >= 0.0 && value < 50.0; });
+}
+
+void AddShow(CLI::App& command, std::vector<int>& show) {
+  command
+      .add_option("--show", show,
+                  "the bands in the picture and in the printed figures: three\n"
+                  "as red, green and blue, or one; default: the first")
+      ->type_name("R,G,B")
+      ->delimiter(',')
+      ->expected(1, 3)
+      ->check(Count(1u << 16));
+}
+
 void AddOutputOptions(CLI::App& command, OutputOptions& options, const OutputTypes& types,
                       const std::string& notes) {
   command.footer(
@@ -78,9 +94,10 @@ void AddOutputOptions(CLI::App& command, OutputOptions& options, const OutputTyp
   command.add_option("--type", options.type, "pixel type of OUTPUT: " + types.help)
       ->type_name("TYPE")
       ->check(OneOf(types.names));
-  command.add_option("--nodata", options.noData, "no-data value of OUTPUT; default: " + types.noDataHelp)
-      ->type_name("V")
-      ->check(NumberWith("a number or nan", [](double value) { return !std::isinf(value); }));
+  if (!types.noDataHelp.empty())
+    command.add_option("--nodata", options.noData, "no-data value of OUTPUT; default: " + types.noDataHelp)
+        ->type_name("V")
+        ->check(NumberWith("a number or nan", [](double value) { return !std::isinf(value); }));
   command
       .add_option("--tile", options.tile,
                   "side of the tiles in pixels, 512 by default; OUTPUT does not depend on it")
@@ -110,7 +127,7 @@ void AddJobOptions(CLI::App& command, JobOptions& options, const OutputTypes& ty
       notes +
           "\n"
           "No-data: a pixel is left out where a no-data value, a mask band or an alpha band of INPUT\n"
-          "says so, and where a sample is NaN. OUTPUT keeps the georeference of INPUT, and appears\n"
+          "says so, and where a sample is NaN. OUTPUT is georeferenced as INPUT is, and appears\n"
           "under its name only when it is complete.\n");
 }
 

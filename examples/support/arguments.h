@@ -15,7 +15,7 @@ namespace examples {
 struct OutputTypes {
   std::vector<std::string> names;
   std::string help;
-  std::string noDataHelp;  ///< the no-data values that they have unless stated
+  std::string noDataHelp;  ///< the no-data values that they have unless stated; empty: none can be stated
 };
 
 /// Adds the arguments of `OutputOptions` to a command, and `notes` to the end of its help.
@@ -32,8 +32,8 @@ void AddJobOptions(CLI::App& command, JobOptions& options, const OutputTypes& ty
 void AddBandList(CLI::App& command, const std::string& name, std::vector<int>& bands,
                  const std::string& help);
 
-/// Refuses anything but a whole number from 1 to `last`.
-CLI::Validator Count(std::uint32_t last);
+/// Refuses anything but a whole number from `first` to `last`.
+CLI::Validator Count(std::uint32_t last, std::uint32_t first = 1);
 
 /// Refuses anything but one of the names.
 CLI::Validator OneOf(const std::vector<std::string>& names);
@@ -44,6 +44,12 @@ CLI::Validator Number();
 CLI::Validator SinglePrecision();
 /// Refuses anything but a finite number above 0.
 CLI::Validator PositiveNumber();
+
+/// Refuses anything but a percentage from 0 to below 50.
+CLI::Validator Tail();
+
+/// Adds `--show`, the bands in the picture and in the printed figures.
+void AddShow(CLI::App& command, std::vector<int>& show);
 
 /// Parses the command line, runs `work` and turns what went wrong into a message on standard error.
 ///

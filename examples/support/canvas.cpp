@@ -14,7 +14,8 @@ void DrawText(cairo_t* canvas, double x, double y, const std::string& text, doub
   cairo_text_extents_t extents;
   cairo_text_extents(canvas, text.c_str(), &extents);
   SetColour(canvas, colour);
-  cairo_move_to(canvas, align == Align::centre ? x - extents.x_advance / 2.0 : x, y);
+  const double share = align == Align::left ? 0.0 : align == Align::centre ? 0.5 : 1.0;
+  cairo_move_to(canvas, x - share * extents.x_advance, y);
   cairo_show_text(canvas, text.c_str());
 }
 

@@ -20,7 +20,7 @@ constexpr Colour ink = {0.13, 0.14, 0.16};
 constexpr Colour softInk = {0.42, 0.44, 0.47};
 constexpr Colour flatColour = {0.90, 0.90, 0.88};  ///< of a cell that has no direction
 
-enum class Align { left, centre };
+enum class Align { left, centre, right };
 enum class Weight { normal, bold };
 
 void SetColour(cairo_t* canvas, const Colour& colour);

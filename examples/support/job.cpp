@@ -19,14 +19,6 @@ using orvik::tessel::RasterInfo;
 
 namespace {
 
-std::vector<std::string> FilesOf(GDALDataset& dataset) {
-  char** list = dataset.GetFileList();
-  std::vector<std::string> files;
-  for (char** file = list; file != nullptr && *file != nullptr; ++file) files.emplace_back(*file);
-  CSLDestroy(list);
-  return files;
-}
-
 std::string DescribeCells(GDALDataset& dataset) {
   const Cell cell = CellOf(dataset);
   const char* form = ", cells of %.4g x %.4g %s";
@@ -97,18 +89,18 @@ std::string FiguresOf(const Job& job, GDALDataset& written, const std::vector<in
                                       job.options.type.c_str());
   const std::string time = CPLSPrintf("in %.3f s\n", seconds);
   const auto quantity = [&](int band) { return job.bands[static_cast<std::size_t>(band) - 1]; };
-  const auto figures = [&](int band) {
-    return Describe(Summarise(*written.GetRasterBand(band), quantity(band)), quantity(band));
-  };
   if (bands.size() == 1) {
     const int band = bands.front();
+    const Summary summary = Summarise(*written.GetRasterBand(band), quantity(band));
     const std::string place = count > 1 ? CPLSPrintf(" (band %d of %zu)", band, count) : "";
-    return job.options.output + ": " + quantity(band).name + place + size + figures(band) + ", " + time;
+    return job.options.output + ": " + quantity(band).name + place + size +
+           Describe(summary, quantity(band)) + ", " + time + DescribeClasses(summary, quantity(band));
   }
   std::string text =
       job.options.output + ": " + job.name + ", " + std::to_string(count) + " bands" + size + time;
   for (const int band : bands)
-    text += "  band " + std::to_string(band) + ", " + quantity(band).name + ": " + figures(band) + "\n";
+    text += "  band " + std::to_string(band) + ", " + quantity(band).name + ": " +
+            Describe(Summarise(*written.GetRasterBand(band), quantity(band)), quantity(band)) + "\n";
   return text;
 }
 
@@ -125,6 +117,14 @@ DatasetPtr OpenInput(const JobOptions& options) {
   DatasetPtr input = OpenRaster("INPUT", options.input);
   CheckOutputs(options, {input.get()}, options.NoData());
   return input;
+}
+
+std::vector<std::string> FilesOf(GDALDataset& dataset) {
+  char** list = dataset.GetFileList();
+  std::vector<std::string> files;
+  for (char** file = list; file != nullptr && *file != nullptr; ++file) files.emplace_back(*file);
+  CSLDestroy(list);
+  return files;
 }
 
 void CheckOutputs(const OutputOptions& options, const std::vector<GDALDataset*>& inputs, double noData) {
@@ -157,6 +157,34 @@ std::vector<int> ChosenBands(const std::vector<int>& asked, GDALDataset& input) 
   const std::vector<int> bands = asked.empty() ? ValueBands(input) : asked;
   if (bands.empty()) throw Refusal("INPUT", "all bands are alpha bands", "a band with values, or --bands");
   return bands;
+}
+
+std::vector<int> ShownPlaces(const std::vector<int>& show, const std::vector<int>& bands,
+                             const std::string& done) {
+  if (show.size() == 2)
+    throw Refusal("--show", "two bands make no picture", "three for red, green and blue, or one");
+  std::vector<int> places;
+  for (const int band : show) {
+    const auto at = std::find(bands.begin(), bands.end(), band);
+    if (at == bands.end())
+      throw Refusal("--show", "band " + std::to_string(band) + " is not " + done, "one of the --bands");
+    places.push_back(static_cast<int>(at - bands.begin()));
+  }
+  return places.empty() ? std::vector<int>{0} : places;
+}
+
+std::string ShowPlaces(Job& job, const std::vector<int>& places, const std::vector<int>& bands) {
+  const std::string parts[] = {"red: ", "green: ", "blue: "};
+  const bool composite = places.size() == 3;
+  std::string list;
+  for (const int place : places) {
+    const std::string band = std::to_string(bands[static_cast<std::size_t>(place)]);
+    if (composite)
+      job.style.composite.push_back({place + 1, parts[job.style.composite.size()] + "band " + band});
+    list += (list.empty() ? "" : ", ") + band;
+  }
+  job.shown = static_cast<std::size_t>(places.front());
+  return (composite ? "bands " : "band ") + list;
 }
 
 std::string DescribeGrid(const std::string& what, GDALDataset& dataset) {

@@ -39,6 +39,9 @@ struct JobOptions : OutputOptions {
 /// value that does not fit into the output.
 DatasetPtr OpenInput(const JobOptions& options);
 
+/// The files that a raster is read from.
+std::vector<std::string> FilesOf(GDALDataset& dataset);
+
 /// Refuses outputs that are files of the inputs, and a no-data value that does not fit into the output.
 void CheckOutputs(const OutputOptions& options, const std::vector<GDALDataset*>& inputs, double noData);
 
@@ -66,6 +69,15 @@ struct Job {
   std::vector<Panel> beside = {};  ///< more maps of the picture, with figures of their own
   std::string name = {};           ///< of the bands together; empty: the name of the shown one
 };
+
+/// The places in `bands` of those that `--show` asks for, else the first: three as red, green and blue, or
+/// one.
+/// @param done  what the program does to its bands, for the message of a Refusal: "stretched"
+std::vector<int> ShownPlaces(const std::vector<int>& show, const std::vector<int>& bands,
+                             const std::string& done);
+
+/// Shows the output's bands at these places, which were made of `bands`. Returns "band 4" or "bands 4, 3, 2".
+std::string ShowPlaces(Job& job, const std::vector<int>& places, const std::vector<int>& bands);
 
 /// Fills one tile of the output.
 using TileWork = std::function<void(const Tile& tile, orvik::tessel::Raster& out)>;

@@ -79,12 +79,12 @@ void DrawKey(cairo_t* canvas, double x, double y, const Colour& colour, const st
 }
 
 // A square that shows what stands behind the picture, as the map does where it has no data.
-void DrawNoDataKey(cairo_t* canvas, double x, double y) {
+void DrawNoDataKey(cairo_t* canvas, double x, double y, const std::string& label) {
   cairo_rectangle(canvas, x, y, 22.0, 22.0);
   cairo_set_operator(canvas, CAIRO_OPERATOR_CLEAR);
   cairo_fill(canvas);
   cairo_set_operator(canvas, CAIRO_OPERATOR_OVER);
-  DrawKeyFrame(canvas, x, y, "no data");
+  DrawKeyFrame(canvas, x, y, label);
 }
 
 // The name and up to two lines of explanation; returns the height that they end at.
@@ -124,6 +124,12 @@ double DrawRamp(cairo_t* canvas, double x, double y, const Legend& legend) {
 
 }  // namespace
 
+int LegendHeight(const PictureStyle& style) {
+  constexpr int head = 72;
+  const std::size_t keys = style.composite.size() + style.classes.size() + 1;  // and one for no-data
+  return head + static_cast<int>(keyStep) * static_cast<int>(keys);
+}
+
 void DrawLegend(cairo_t* canvas, double x, double y, const Legend& legend) {
   const PictureStyle& style = legend.panel.style;
   y = DrawHead(canvas, x, y, legend.panel);
@@ -133,7 +139,7 @@ void DrawLegend(cairo_t* canvas, double x, double y, const Legend& legend) {
   }
   const bool keys = !style.composite.empty() || !style.classes.empty();
   y = keys ? DrawKeys(canvas, x, y + 20.0, style) : DrawRamp(canvas, x, y, legend);
-  if (legend.noData) DrawNoDataKey(canvas, x, y);
+  if (legend.noData) DrawNoDataKey(canvas, x, y, style.noData);
 }
 
 }  // namespace examples

@@ -17,6 +17,11 @@ struct Legend {
 ///
 /// Below the name and its notes stand the ramp between the words for its ends, or a compass rose, or a square
 /// for each class or for each band of a composite; then one for pixels without data if there are some.
+///
+/// The paper has to be `LegendHeight` high.
 void DrawLegend(cairo_t* canvas, double x, double y, const Legend& legend);
+
+/// The room that the keys of a legend take, which is more than that of a map where there are many classes.
+int LegendHeight(const PictureStyle& style);
 
 }  // namespace examples

@@ -54,6 +54,11 @@ Colour GreenRamp(double position) {
   return Oklch(0.93 - 0.55 * position, chroma, 0.27 + 0.13 * position);
 }
 
+Colour ClassColour(std::size_t place, std::size_t count) {
+  const double position = count > 1 ? static_cast<double>(place) / static_cast<double>(count - 1) : 0.5;
+  return Oklch((count - place) % 2 == 1 ? 0.58 : 0.84, 0.12, 0.70 - 0.64 * position);
+}
+
 Colour CompassRamp(double position) {
   const double light = std::cos(2.0 * std::numbers::pi * (position - 315.0 / 360.0));
   return Oklch(0.70 + 0.18 * light, 0.105, 0.58 - position);

@@ -1,5 +1,7 @@
 #pragma once
 
+#include <cstddef>
+
 namespace examples {
 
 /// A colour of the sRGB space, each part from 0 to 1.
@@ -28,6 +30,10 @@ Colour PlantRamp(double position);
 
 /// From pale sand to dark green, evenly darker: for amounts of vegetation.
 Colour GreenRamp(double position);
+
+/// The colour of one of `count` classes in their order: from blue over green and yellow to red, lighter and
+/// darker by turns, so that neighbours differ.
+Colour ClassColour(std::size_t place, std::size_t count);
 
 /// A closed circle of hues, lightest at the north-west, as maps light their relief: for directions, 0 and 1
 /// being north.

@@ -178,10 +178,14 @@ void DrawPanel(cairo_t* canvas, GDALDataset& dataset, const Panel& panel, const 
 void DrawPicture(GDALDataset& dataset, const std::vector<Panel>& panels, const std::string& png) {
   const int count = static_cast<int>(panels.size()), inRow = std::min(count, mostInRow);
   std::vector<Shown> shown;
-  for (const Panel& panel : panels) shown.push_back(ReadShown(dataset, panel, inRow));
+  int tallest = 0;
+  for (const Panel& panel : panels) {
+    shown.push_back(ReadShown(dataset, panel, inRow));
+    tallest = std::max(tallest, LegendHeight(panel.style));
+  }
   const Layout layout{inRow, (count + inRow - 1) / inRow,
                       std::max(shown[0].width * shown[0].factor, leastMap),
-                      std::max(shown[0].height * shown[0].factor, leastHeight)};
+                      std::max({shown[0].height * shown[0].factor, leastHeight, tallest})};
   Surface paper(cairo_image_surface_create(CAIRO_FORMAT_ARGB32, layout.PanelWidth() * inRow,
                                            header + layout.PanelHeight() * layout.rows));
   Canvas canvas(cairo_create(paper.get()));

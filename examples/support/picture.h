@@ -35,6 +35,7 @@ struct PictureStyle {
   std::string top = {};                       ///< what the upper end of the ramp means
   std::string bottom = {};                    ///< what the lower end means
   std::vector<PictureClass> classes = {};     ///< in place of the ramp
+  std::string noData = "no data";             ///< what the legend calls pixels without data
   std::vector<CompositeBand> composite = {};  ///< three bands as red, green and blue in place of the ramp
 };
 

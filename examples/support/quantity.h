@@ -2,6 +2,7 @@
 
 #include <optional>
 #include <string>
+#include <vector>
 
 namespace examples {
 
@@ -15,6 +16,7 @@ struct Quantity {
   std::optional<double> flat = {};  ///< the stored value of a cell that has no direction
   std::optional<double> noData =
       {};  ///< the stored value of a pixel without data; none: every pixel has data
+  std::vector<std::string> classes = {};  ///< what 1, 2, ... stand for; there are no other values
 };
 
 }  // namespace examples

@@ -53,7 +53,9 @@ double NiceStep(double roughly) {
 Scale::Scale(std::vector<double> values, Span span) {
   std::sort(values.begin(), values.end());
   if (span == Span::percent) {
-    SpanPercent();
+    SpanTo(100.0, 20.0);
+  } else if (span == Span::byte) {
+    SpanTo(255.0, 51.0);
   } else if (span == Span::change || span == Span::bothSigns) {
     SpanChange(values, span == Span::change ? "+%.6g" : "%.6g");
   } else if (span == Span::factor) {
@@ -89,9 +91,9 @@ void Scale::SpanValues(const std::vector<double>& values, bool fromZero) {
   for (int i = 0; i <= last; ++i) AddTick(low_ + i * step, "%.6g");
 }
 
-void Scale::SpanPercent() {
-  high_ = 100.0;
-  for (int i = 0; i <= 100; i += 20) AddTick(i, "%.6g");
+void Scale::SpanTo(double high, double step) {
+  high_ = high;
+  for (int i = 0; i * step <= high; ++i) AddTick(i * step, "%.6g");
 }
 
 void Scale::SpanChange(const std::vector<double>& values, const char* positive) {

@@ -10,6 +10,7 @@ enum class Span {
   values,     ///< from the least to the greatest, without the outermost half percent on both sides
   fromZero,   ///< from 0 to the greatest, likewise
   percent,    ///< from 0 to 100
+  byte,       ///< from 0 to 255
   bothSigns,  ///< equally far to both sides of 0, so that 98 % of the values are within
   change,     ///< likewise, with the signs of increase and decrease
   factor,     ///< by an equal factor to both sides of 1, likewise, in logarithms
@@ -33,7 +34,7 @@ class Scale {
 
  private:
   void SpanValues(const std::vector<double>& values, bool fromZero);
-  void SpanPercent();
+  void SpanTo(double high, double step);
   void SpanChange(const std::vector<double>& values, const char* positive);
   void SpanFactor(const std::vector<double>& values);
   void AddTick(double value, const char* format);

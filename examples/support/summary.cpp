@@ -33,7 +33,8 @@ Summary Summarise(GDALRasterBand& band, const Quantity& quantity) {
   std::vector<double> values(static_cast<std::size_t>(width));
   std::vector<unsigned char> valid(values.size());
   Summary summary{.min = std::numeric_limits<double>::infinity(),
-                  .max = -std::numeric_limits<double>::infinity()};
+                  .max = -std::numeric_limits<double>::infinity(),
+                  .classes = std::vector<std::uint64_t>(quantity.classes.size())};
   Sums sums;
   for (int y = 0; y < band.GetYSize(); ++y) {
     ThrowOnGdalError("reading back", band.RasterIO(GF_Read, 0, y, width, 1, values.data(), width, 1,
@@ -52,6 +53,7 @@ Summary Summarise(GDALRasterBand& band, const Quantity& quantity) {
       summary.min = std::fmin(summary.min, value);
       summary.max = std::fmax(summary.max, value);
       sums.Add(value);
+      if (!summary.classes.empty()) ++summary.classes[static_cast<std::size_t>(value) - 1];
     }
   }
   const auto counted = static_cast<double>(summary.valid - summary.flat);
@@ -64,6 +66,10 @@ std::string Describe(const Summary& summary, const Quantity& quantity) {
       CPLSPrintf("%llu of %llu pixels valid", static_cast<unsigned long long>(summary.valid),
                  static_cast<unsigned long long>(summary.pixels));
   if (summary.valid == summary.flat) return "no values, " + counts;
+  if (!quantity.classes.empty())
+    return CPLSPrintf("%zu classes, %llu of %llu pixels in one of them", quantity.classes.size(),
+                      static_cast<unsigned long long>(summary.valid),
+                      static_cast<unsigned long long>(summary.pixels));
   if (quantity.bitmap) return CPLSPrintf("%.2f %% inside, ", 100.0 * summary.mean) + counts;
   std::string text = CPLSPrintf("min %.2f, %s %.2f, max %.2f", summary.min,
                                 quantity.compass ? "mean direction" : "mean", summary.mean, summary.max);
@@ -71,6 +77,18 @@ std::string Describe(const Summary& summary, const Quantity& quantity) {
   text += ", " + counts;
   if (quantity.flat)
     text += CPLSPrintf(" (%llu of them flat)", static_cast<unsigned long long>(summary.flat));
+  return text;
+}
+
+std::string DescribeClasses(const Summary& summary, const Quantity& quantity) {
+  std::string text;
+  for (std::size_t i = 0; i < quantity.classes.size(); ++i) {
+    const std::uint64_t count = summary.classes[i];
+    const double share =
+        summary.valid > 0 ? 100.0 * static_cast<double>(count) / static_cast<double>(summary.valid) : 0.0;
+    text += CPLSPrintf("  class %zu, ", i + 1) + quantity.classes[i] +
+            CPLSPrintf(": %llu pixels, %.2f %%\n", static_cast<unsigned long long>(count), share);
+  }
   return text;
 }
 

@@ -2,6 +2,7 @@
 
 #include <cstdint>
 #include <string>
+#include <vector>
 
 #include "gdal.h"
 #include "quantity.h"
@@ -16,11 +17,15 @@ struct Summary {
   double min = 0.0;
   double mean = 0.0;  ///< of directions: the direction of their sum, from 0 to 360
   double max = 0.0;
+  std::vector<std::uint64_t> classes = {};  ///< pixels of each class
 };
 
 Summary Summarise(GDALRasterBand& band, const Quantity& quantity);
 
 /// "min 0.0, mean 2.1, max 11.3 degrees, 12321 of 12321 pixels valid"
 std::string Describe(const Summary& summary, const Quantity& quantity);
+
+/// A line for each class of the quantity, with its pixels and its share of those that are in a class.
+std::string DescribeClasses(const Summary& summary, const Quantity& quantity);
 
 }  // namespace examples

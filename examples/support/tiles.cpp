@@ -36,6 +36,13 @@ void MarkNaN(const Raster& raster, std::vector<unsigned char>& valid) {
       if (std::isnan(samples[(i * raster.channels + c) * step])) valid[i] = 0;
 }
 
+// Marks the pixels that have the value among their samples.
+void MarkEqual(const Raster& raster, unsigned char value, std::vector<unsigned char>& valid) {
+  for (std::size_t i = 0; i < valid.size(); ++i)
+    for (std::size_t c = 0; c < raster.channels; ++c)
+      if (raster.data[i * raster.channels + c] == value) valid[i] = 0;
+}
+
 }  // namespace
 
 // The part of a tile with its margin that lies in the image, and where it lies in the tile's buffer.
@@ -88,7 +95,7 @@ TileReader::TileReader(BandSource source, std::uint32_t margin, std::uint32_t si
     throw Refusal(source_.argument, "has signed bytes, which are not read as another type",
                   "a raster of another pixel type");
   dataType_ = allSigned ? DataType::Of<char>() : TypeOf(source_.type, source_.argument);
-  masked_ = masked_ || dataType_.isFloat;
+  masked_ = masked_ || dataType_.isFloat || source_.hole;
 
   const auto extent = [&](int size) {
     return std::min<std::uint64_t>(static_cast<std::uint64_t>(size), side) + 2 * margin_;
@@ -158,6 +165,7 @@ std::vector<unsigned char> TileReader::ReadValidity(const Window& inside, const 
   }
   if (dataType_.isFloat && dataType_.sizeBits == 32) MarkNaN<float>(raster, valid);
   if (dataType_.isFloat && dataType_.sizeBits == 64) MarkNaN<double>(raster, valid);
+  if (source_.hole) MarkEqual(raster, *source_.hole, valid);
   return valid;
 }
 

@@ -2,6 +2,7 @@
 
 #include <cstdint>
 #include <memory>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -31,9 +32,10 @@ struct LoadedTile {
 /// Which samples of a raster are read.
 struct BandSource {
   GDALDataset& dataset;
-  std::vector<int> bands;           ///< count from 1
-  std::string argument = "INPUT";   ///< names the raster in messages
-  GDALDataType type = GDT_Unknown;  ///< to read in; unknown: the type that holds all the bands
+  std::vector<int> bands;                  ///< count from 1
+  std::string argument = "INPUT";          ///< names the raster in messages
+  GDALDataType type = GDT_Unknown;         ///< to read in; unknown: the type that holds all the bands
+  std::optional<unsigned char> hole = {};  ///< a value of `Byte` samples that stands for no data too
 };
 
 /// Reads tiles of some bands, in their own type unless told otherwise, with a margin of neighbouring pixels
@@ -41,7 +43,7 @@ struct BandSource {
 ///
 /// The margin holds the pixels of the neighbouring tiles; beyond the image it repeats the nearest edge pixel,
 /// validity included. A pixel is invalid where GDAL's mask of one of the bands says so, which covers no-data
-/// values, alpha and mask bands, or where a floating sample is NaN.
+/// values, alpha and mask bands, or where a sample is NaN or the hole of the source.
 class TileReader {
  public:
   /// @throws Refusal if a tile of `side` x `side` pixels is larger than a raster can be, or if signed bytes
