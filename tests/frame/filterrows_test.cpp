@@ -58,6 +58,47 @@ TEST(FilterRows, MaskIsReadByItsOwnGeometry) {
   EXPECT_EQ(masked, (std::vector<bool>{true, false}));
 }
 
+TEST(FilterRows, SamplesThatAreReadComeFromPixelsOfAnotherTypeAndFromTheMemoryBehind) {
+  Image<unsigned char> image({5, 2, 2}, {1, 1});
+  for (std::uint64_t i = 0; i < image.dataSize; ++i) image.data[i] = static_cast<unsigned char>(i + 1);
+  Image<char> out({5, 2});
+  Mask mask(5, 2);
+  mask.SetValid(3, 1, false);
+  for (const std::size_t samples : {1u, 2u, 3u}) {
+    std::vector<int> seen, expected, excluded;
+    FilterShape shape{3};
+    shape.inSamples = samples;
+    FilterRows<unsigned short, char>(image, &mask, out, shape, [&](const auto& block) {
+      EXPECT_EQ(block.stride, samples);
+      for (std::size_t i = 0; i < block.pixels; ++i) {
+        if (block.masked && block.valid[i] == 0) excluded.push_back(block.image[i * block.stride]);
+        for (std::size_t c = 0; c < samples; ++c) seen.push_back(block.image[i * block.stride + c]);
+      }
+    });
+    for (int y = 0; y < 2; ++y) {
+      for (int x = 0; x < 5; ++x) {
+        const int first = static_cast<int>(&image.At(x, y) - image.data) + 1;  // the low byte of sample 0
+        for (int c = 0; c < static_cast<int>(samples); ++c)
+          expected.push_back((first + 2 * c) | ((first + 2 * c + 1) << 8));
+      }
+    }
+    EXPECT_EQ(seen, expected) << samples << " samples";
+    const int masked = static_cast<int>(&image.At(3, 1) - image.data) + 1;
+    EXPECT_EQ(excluded, std::vector<int>{masked | ((masked + 1) << 8)});
+  }
+}
+
+TEST(FilterRows, SamplesPastTheMemoryAre0) {
+  Image<unsigned char> image({3, 1}, {}, 9), out({3, 1});
+  FilterShape shape{3};
+  shape.inSamples = 2;
+  FilterRows<unsigned char, unsigned char>(image, nullptr, out, shape, [](const auto& block) {
+    EXPECT_EQ(block.stride, 2u);
+    for (std::size_t i = 0; i < block.pixels; ++i) block.target[i] = block.image[i * block.stride + 1];
+  });
+  EXPECT_EQ(tests::Bytes(out), (std::vector<unsigned char>{9, 9, 0}));
+}
+
 /// Writes 1, 2, 3, ... to two samples of each pixel of a row of four, in blocks of three.
 void WritePairs(Raster& out, Walk walk) {
   Image<unsigned char> image({4, 1});

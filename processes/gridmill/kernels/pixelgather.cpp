@@ -11,14 +11,6 @@ namespace orvik::kernels {
 
 namespace {
 
-/// Pixels of the size of a word, wherever they lie.
-template <class Word>
-void TakeWords(const unsigned char* __restrict row, const std::uint32_t* columns, std::size_t count,
-               unsigned char* __restrict target) {
-  for (std::size_t i = 0; i < count; ++i)
-    std::memcpy(target + i * sizeof(Word), row + columns[i] * sizeof(Word), sizeof(Word));
-}
-
 /// Pixels of any size that is known to the compiler.
 template <std::size_t bytes>
 void TakeSized(const unsigned char* __restrict row, const std::uint32_t* columns, std::size_t count,

@@ -24,7 +24,7 @@ class PixelGather {
     return row + columns_[position] * pixelBytes_;
   }
 
-  /// Copies `count` pixels from the position `from` on, a multiple of 16 where there are more behind.
+  /// Copies `count` pixels from the position `from` on, which is a multiple of 16.
   void Take(const unsigned char* row, std::size_t from, std::size_t count, unsigned char* target) const;
 
  private:
