@@ -59,7 +59,8 @@ double SlowBlue(const Pixel& pixel) {
 unsigned char SlowClip(double value) {
   const double rounded = value + 0.5;
   if (std::isnan(rounded) || rounded <= 0.0) return 0;
-  return rounded >= 255.0 ? 255 : static_cast<unsigned char>(rounded);
+  if (rounded >= 255.0) return 255;
+  return static_cast<unsigned char>(rounded);
 }
 
 bool IsBackground(const Rule& rule, const Pixel& pixel) {
