@@ -62,6 +62,13 @@ constexpr Row kRows[] = {
      .gridmill = Transfer,
      .naive = NaiveTransfer<unsigned short, float>,
      .opencv = OpenCvConvertedNearest},
+    {.job = "transfer, same size",
+     .types = "u16 -> f32",
+     .workload = Scene<unsigned short, float, 1, 1>,
+     .gridmill = Transfer,
+     .naive = NaiveTransfer<unsigned short, float>,
+     .opencv = OpenCvConverted,
+     .peersWithin = 0.0},
 };
 
 }  // namespace

@@ -56,6 +56,20 @@ constexpr Row kRows[] = {
      .opencv = OpenCvClasses,
      .peersWithin = 0.0,
      .python = "classes_of_shorts"},
+    {.job = "range classes, inRange",
+     .types = "f32 -> u8",
+     .workload = Scene<float, unsigned char, 1, 1>,
+     .gridmill = Classes,
+     .naive = NaiveClasses<float>,
+     .opencv = OpenCvClassesInRange,
+     .peersWithin = 0.0},
+    {.job = "range classes, inRange",
+     .types = "u16 -> u8",
+     .workload = Scene<unsigned short, unsigned char, 1, 1>,
+     .gridmill = Classes,
+     .naive = NaiveClasses<unsigned short>,
+     .opencv = OpenCvClassesInRange,
+     .peersWithin = 0.0},
 };
 
 }  // namespace

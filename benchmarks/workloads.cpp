@@ -286,6 +286,7 @@ template Workload Dates<short, unsigned short, float, 1, 1, MaskPattern::kNone>(
 template Workload Dates<float, float, float, 1, 1, MaskPattern::kNone>(std::uint32_t);
 template Workload Scene<unsigned char, unsigned char, 3, 3>(std::uint32_t);
 template Workload Scene<unsigned short, unsigned char, 1, 1>(std::uint32_t);
+template Workload Scene<unsigned short, float, 1, 1>(std::uint32_t);
 template Workload Scene<unsigned short, float, 3, 3>(std::uint32_t);
 template Workload Scene<unsigned short, float, 4, 1>(std::uint32_t);
 template Workload Scene<unsigned short, float, 7, 12>(std::uint32_t);

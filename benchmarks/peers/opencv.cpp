@@ -1,5 +1,6 @@
 #include <algorithm>
 #include <array>
+#include <cmath>
 #include <cstring>
 #include <iterator>
 #include <vector>
@@ -354,6 +355,33 @@ void OpenCvClasses(const Workload& work) {
     cv::compare(source, constants.noData.As(source), inside, cv::CMP_NE);
     cv::bitwise_and(target, inside, target);
   });
+}
+
+/// Class by class, in strips that stay in the cache. `inRange` includes its bounds.
+void OpenCvClassesInRange(const Workload& work) {
+  const auto next = [&work](float from, float to) -> double {
+    return work.in->dataType.isFloat ? std::nextafter(from, to) : from + (to > from ? 1.0f : -1.0f);
+  };
+  cv::Mat inside;
+  ForEachStrip(work, RowsOf(work, kConstantPixels), [&](int y, int rows) {
+    const cv::Mat source = View(*work.in, 0, y, rows);
+    cv::Mat target = View(*work.twin, 0, y, rows);
+    target.setTo(0);
+    for (std::size_t k = 0; k < std::size(kClassFrom); ++k) {
+      const float from = kClassFrom[k], to = kClassTo[k];
+      cv::inRange(source, cv::Scalar(next(from, to)), cv::Scalar(next(to, from)), inside);
+      target.setTo(static_cast<double>(k + 1), inside);
+    }
+    cv::inRange(source, cv::Scalar(kClassNoData), cv::Scalar(kClassNoData), inside);
+    target.setTo(0, inside);
+  });
+}
+
+void OpenCvConverted(const Workload& work) {
+  [[maybe_unused]] static const bool serial = (cv::setNumThreads(1), true);
+  const int rows = static_cast<int>(work.twin->height);
+  cv::Mat target = View(*work.twin, 0, 0, rows);
+  View(*work.in, 0, 0, rows).convertTo(target, CV_32F);
 }
 
 void OpenCvNearest(const Workload& work) {

@@ -29,6 +29,8 @@ GRIDMILL_PEER void OpenCvSquaredGradient(const Workload& work);
 GRIDMILL_PEER void OpenCvHistograms(const Workload& work);
 GRIDMILL_PEER void OpenCvWideHistogram(const Workload& work);
 GRIDMILL_PEER void OpenCvClasses(const Workload& work);
+GRIDMILL_PEER void OpenCvClassesInRange(const Workload& work);
+GRIDMILL_PEER void OpenCvConverted(const Workload& work);
 GRIDMILL_PEER void OpenCvNearest(const Workload& work);
 GRIDMILL_PEER void OpenCvConvertedNearest(const Workload& work);
 GRIDMILL_PEER void OpenCvNaturalColour(const Workload& work);

@@ -13,6 +13,7 @@
 #include "processes/gridmill/frame/frame.h"
 #include "processes/gridmill/frame/pixelreader.h"
 #include "processes/gridmill/frame/pixelwriter.h"
+#include "processes/gridmill/kernels/multiversion.h"
 #include "processes/gridmill/kernels/pixelgather.h"
 #include "processes/gridmill/kernels/rowconversions.h"
 
@@ -32,21 +33,25 @@ struct Axis {
   unsigned int extent;  ///< of the input
 
   /// The input coordinate of an output coordinate: the nearest one, ties upwards.
-  unsigned int operator()(unsigned int p) const {
+  GRIDMILL_INLINE unsigned int Nearest(unsigned int p) const {
     // Deliberate: a coordinate before the region wraps.
     const unsigned int t = p - outStart + outOrigin;
     const double u = t / scale + inStart - inOrigin + 0.5;
     const int nearest = tessel::TruncateSigned<int>(u);
-    if (nearest < 0) return 0;
-    return std::min(static_cast<unsigned int>(nearest), extent - 1);
-  }
-
-  std::vector<std::uint32_t> Coordinates(std::uint32_t count) const {
-    std::vector<std::uint32_t> coordinates(count);
-    for (std::uint32_t p = 0; p < count; ++p) coordinates[p] = (*this)(p);
-    return coordinates;
+    const unsigned int held = nearest < 0 ? 0 : static_cast<unsigned int>(nearest);
+    return held < extent ? held : extent - 1;
   }
 };
+
+GRIDMILL_MULTIVERSION void MapRow(const Axis& axis, std::size_t count, std::uint32_t* __restrict nearest) {
+  for (std::size_t p = 0; p < count; ++p) nearest[p] = axis.Nearest(static_cast<std::uint32_t>(p));
+}
+
+std::vector<std::uint32_t> Mapped(const Axis& axis, std::uint32_t count) {
+  std::vector<std::uint32_t> nearest(count);
+  MapRow(axis, count, nearest.data());
+  return nearest;
+}
 
 // ---- row
 
@@ -87,8 +92,8 @@ struct Mapping {
     const auto& [outX, outY, outWidth, outHeight] = of.outRegion;
     const double sx = static_cast<double>(outWidth) / inWidth;
     const double sy = static_cast<double>(outHeight) / inHeight;
-    columns = Axis{inX, outX, sx, in.originX, out.originX, in.width}.Coordinates(out.width);
-    rows = Axis{inY, outY, sy, in.originY, out.originY, in.height}.Coordinates(out.height);
+    columns = Mapped({inX, outX, sx, in.originX, out.originX, in.width}, out.width);
+    rows = Mapped({inY, outY, sy, in.originY, out.originY, in.height}, out.height);
   }
 };
 
