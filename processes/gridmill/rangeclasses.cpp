@@ -71,7 +71,7 @@ GRIDMILL_MULTIVERSION void NumberGroup(const Value* __restrict values, const Key
   for (std::size_t i = 0; i < count; ++i) {
     const Key key = KeyOf(values[i]);
     Key found = static_cast<Key>(numbers[i]);
-    // Unrolled here: compilers do not vectorise around a loop over eight ranges.
+    // Unrolled here: compilers do not vectorise around a loop over many ranges.
     [&]<std::size_t... k>(std::index_sequence<k...>) {
       ((found = static_cast<Key>(key - first[k]) <= span[k] ? number[k] : found), ...);
     }
@@ -86,6 +86,7 @@ void NumberRow(const Value* values, const std::vector<KeyRange<Value>>& ranges, 
   std::fill_n(numbers, count, Number{0});
   const KeyRange<Value>* range = ranges.data();
   const KeyRange<Value>* const end = range + ranges.size();
+  for (; end - range >= 9; range += 9) NumberGroup<9>(values, range, count, numbers);  // eight and no-data
   for (; end - range >= 8; range += 8) NumberGroup<8>(values, range, count, numbers);
   for (; end - range >= 3; range += 3) NumberGroup<3>(values, range, count, numbers);
   for (; range < end; ++range) NumberGroup<1>(values, range, count, numbers);
