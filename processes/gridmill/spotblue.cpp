@@ -12,6 +12,7 @@
 #include "processes/gridmill/kernels/bytecolours.h"
 #include "processes/gridmill/kernels/maskedcells.h"
 #include "processes/gridmill/kernels/multiversion.h"
+#include "processes/gridmill/kernels/pixelplanes.h"
 #include "processes/gridmill/kernels/rowconversions.h"
 #include "processes/gridmill/kernels/syntheticblue.h"
 #include "processes/gridmill/kernels/validrange.h"
@@ -160,10 +161,9 @@ class ByteWay<unsigned char, unsigned char> {
 
   /// Returns false, with nothing written, if the pixels have to go the long way.
   bool Write(const frame::FilterBlock<unsigned char, unsigned char>& block) const {
-    if (!open_) return false;
+    if (!open_ || block.stride != 3) return false;
     unsigned char planes[3][kBlock], bands[3][kBlock], valid[kBlock];
-    for (std::size_t c = 0; c < 3; ++c)
-      kernels::CopyRow(block.image + c, block.stride, block.pixels, planes[c]);
+    kernels::SplitTriples(block.image, block.pixels, planes[0], planes[1], planes[2]);
     std::fill_n(valid, block.pixels, static_cast<unsigned char>(1));
     if (block.masked) std::copy_n(block.valid, block.pixels, valid);
     if (!rule_.Make(planes, valid, block.pixels, bands)) return false;

@@ -87,5 +87,21 @@ TYPED_TEST(PixelPlanesOf, JoinPixelsPutsEachPlaneIntoItsSample) {
   }
 }
 
+TEST(PixelPlanes, SplitTriplesPutsEachByteIntoItsPlane) {
+  std::mt19937_64 random(32);
+  for (const std::size_t count : Counts()) {
+    std::vector<unsigned char> pixels(3 * count);
+    for (unsigned char& byte : pixels) byte = static_cast<unsigned char>(random());
+    std::vector<std::vector<unsigned char>> planes(3, std::vector<unsigned char>(count + 2 * kGuard, 77));
+    SplitTriples(pixels.data(), count, planes[0].data() + kGuard, planes[1].data() + kGuard,
+                 planes[2].data() + kGuard);
+    for (std::size_t c = 0; c < 3; ++c) {
+      std::vector<unsigned char> expected(count + 2 * kGuard, 77);
+      for (std::size_t i = 0; i < count; ++i) expected[kGuard + i] = pixels[3 * i + c];
+      EXPECT_EQ(planes[c], expected) << count << " pixels, channel " << c;
+    }
+  }
+}
+
 }  // namespace
 }  // namespace orvik::kernels

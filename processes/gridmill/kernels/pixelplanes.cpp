@@ -53,6 +53,16 @@ GRIDMILL_MULTIVERSION void SplitPixels(const Sample* __restrict first, std::size
   }
 }
 
+GRIDMILL_MULTIVERSION void SplitTriples(const unsigned char* __restrict pixels, std::size_t count,
+                                        unsigned char* __restrict first, unsigned char* __restrict second,
+                                        unsigned char* __restrict third) {
+  for (std::size_t i = 0; i < count; ++i) {
+    first[i] = pixels[3 * i];
+    second[i] = pixels[3 * i + 1];
+    third[i] = pixels[3 * i + 2];
+  }
+}
+
 /// The last square of a pixel's samples ends with them: it may write some a second time.
 template <class Sample>
 GRIDMILL_MULTIVERSION void JoinPixels(const Sample* const* __restrict planes, std::size_t samples,

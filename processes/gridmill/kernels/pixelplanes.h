@@ -17,6 +17,10 @@ template <class Sample>
 void SplitPixels(const Sample* first, std::size_t stride, std::size_t channels, std::size_t count,
                  Sample (*planes)[kBlock]);
 
+/// Copies the samples of `count` pixels of three bytes to planes, in one pass.
+void SplitTriples(const unsigned char* pixels, std::size_t count, unsigned char* first, unsigned char* second,
+                  unsigned char* third);
+
 /// Stores `count` pixels of any number of samples, each from a plane of its own.
 template <class Sample>
 void JoinPixels(const Sample* const* planes, std::size_t samples, std::size_t count, Sample* target);
