@@ -1,10 +1,13 @@
 include(CMakePackageConfigHelpers)
 
-install(TARGETS gridmill EXPORT gridmillTargets LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR})
+# Components: `runtime` is what a program needs, `development` what a compiler needs, `python` the package.
+install(TARGETS gridmill EXPORT gridmillTargets
+        LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR} COMPONENT runtime NAMELINK_COMPONENT development)
 
 foreach(header IN LISTS GRIDMILL_HEADERS)
   cmake_path(GET header PARENT_PATH folder)
-  install(FILES ${PROJECT_SOURCE_DIR}/${header} DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}/gridmill/${folder})
+  install(FILES ${PROJECT_SOURCE_DIR}/${header} DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}/gridmill/${folder}
+          COMPONENT development)
 endforeach()
 
 # find_package(gridmill)
@@ -17,8 +20,8 @@ write_basic_package_version_file(
   VERSION ${PROJECT_VERSION} COMPATIBILITY SameMinorVersion)
 install(FILES ${PROJECT_BINARY_DIR}/cmake/gridmillConfig.cmake
               ${PROJECT_BINARY_DIR}/cmake/gridmillConfigVersion.cmake
-        DESTINATION ${GRIDMILL_CMAKE_DIR})
-install(EXPORT gridmillTargets NAMESPACE gridmill:: DESTINATION ${GRIDMILL_CMAKE_DIR})
+        DESTINATION ${GRIDMILL_CMAKE_DIR} COMPONENT development)
+install(EXPORT gridmillTargets NAMESPACE gridmill:: DESTINATION ${GRIDMILL_CMAKE_DIR} COMPONENT development)
 
 # pkg-config. The prefix follows the file to where it is moved; an absolute library folder stays where it is.
 if(IS_ABSOLUTE "${CMAKE_INSTALL_LIBDIR}")
@@ -32,4 +35,5 @@ cmake_path(APPEND GRIDMILL_PC_LIBDIR "${CMAKE_INSTALL_LIBDIR}")
 set(GRIDMILL_PC_INCLUDEDIR "\${prefix}")
 cmake_path(APPEND GRIDMILL_PC_INCLUDEDIR "${CMAKE_INSTALL_INCLUDEDIR}")
 configure_file(${PROJECT_SOURCE_DIR}/cmake/gridmill.pc.in ${PROJECT_BINARY_DIR}/cmake/gridmill.pc @ONLY)
-install(FILES ${PROJECT_BINARY_DIR}/cmake/gridmill.pc DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig)
+install(FILES ${PROJECT_BINARY_DIR}/cmake/gridmill.pc DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig
+        COMPONENT development)
