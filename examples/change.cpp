@@ -7,11 +7,17 @@
 #include <limits>
 #include <string>
 #include <type_traits>
+#include <utility>
 #include <vector>
 
 #include "processes/gridmill/chandiffchange.h"
+#include "processes/gridmill/chandiffchange2.h"
+#include "processes/gridmill/chanratiochange.h"
 #include "processes/gridmill/chanratiochange2.h"
+#include "processes/gridmill/combchange.h"
+#include "processes/gridmill/intenratiochange.h"
 #include "processes/gridmill/magnitudechange.h"
+#include "processes/gridmill/singlechange.h"
 #include "processes/gridmill/tasseledcapchange.h"
 #include "support/arguments.h"
 #include "support/errors.h"
@@ -35,6 +41,8 @@ using orvik::tessel::Raster;
 // The image of the operators is AFTER and their reference BEFORE, so that the image minus the reference is an
 // increase where it is positive.
 constexpr orvik::changedetection::DiffType increase = orvik::changedetection::eDIFF_FORWARD;
+// The operator of a single band has it the other way round.
+constexpr orvik::changedetection::DiffType singleIncrease = orvik::changedetection::eDIFF_BACKWARD;
 
 struct ChangeOptions : OutputOptions {
   std::string before;
@@ -43,6 +51,8 @@ struct ChangeOptions : OutputOptions {
   std::vector<int> beforeBands;
   std::vector<double> exclude;
   std::optional<int> show;
+  std::vector<int> composite;  // bands of OUTPUT
+  bool twoMasks = false;
   std::string sensor;
   std::string beforeSensor;
 
@@ -106,12 +116,17 @@ Dates OpenDates(const ChangeOptions& options) {
   return dates;
 }
 
-// The bands that were asked for, else all; band by band the same at both dates.
-void ChooseBands(const ChangeOptions& options, Dates& dates) {
+// The bands that were asked for, else all.
+void TakeBands(const ChangeOptions& options, Dates& dates) {
   dates.afterBands = options.bands.empty() ? examples::ValueBands(*dates.after) : options.bands;
   dates.beforeBands = !options.beforeBands.empty() ? options.beforeBands
                       : !options.bands.empty()     ? options.bands
                                                    : examples::ValueBands(*dates.before);
+}
+
+// The same, as many of both dates.
+void ChooseBands(const ChangeOptions& options, Dates& dates) {
+  TakeBands(options, dates);
   const std::size_t before = dates.beforeBands.size(), after = dates.afterBands.size();
   if (before == after && after > 0) return;
   const std::string counts = CPLSPrintf("%zu bands are to be compared with %zu of BEFORE", after, before);
@@ -181,7 +196,8 @@ Mask* Common(LoadedTile& before, LoadedTile& after) {
 struct Words {
   std::string title;
   std::vector<std::string> bands;  // of the output
-  std::string unit = {};
+  std::string unit = {};           // of all bands but
+  std::string shownUnit = {};      // of the one that is shown, if it has a unit of its own
   std::size_t shown = 0;
   PictureStyle style = {};
 };
@@ -189,40 +205,91 @@ struct Words {
 examples::Job JobOf(const ChangeOptions& options, const Dates& dates, const Words& words) {
   const std::filesystem::path before(options.before), after(options.after);
   PictureStyle style = words.style;
-  style.ramp = examples::ChangeRamp;
   style.title = !options.title.empty()
                     ? options.title
                     : words.title + ", " + before.stem().string() + " to " + after.stem().string();
   style.caption =
       examples::DescribeGrid(before.filename().string() + " to " + after.filename().string(), *dates.after);
-  if (style.span == examples::Span::change && words.unit.empty()) style.unit = "in sample units";
-  style.top = "increase";
-  style.bottom = "decrease";
+  if (style.span == examples::Span::change && words.unit.empty() && words.shownUnit.empty())
+    style.unit = "in sample units";
+  if (style.span != examples::Span::values) {
+    style.ramp = examples::ChangeRamp;
+    style.top = "increase";
+    style.bottom = "decrease";
+  }
   std::vector<Quantity> bands;
   for (const std::string& name : words.bands)
     bands.push_back({.name = name, .unit = words.unit, .noData = options.NoDataValue()});
-  return {.options = options, .grid = dates.Grid(), .bands = bands, .shown = words.shown, .style = style};
+  if (!words.shownUnit.empty()) bands[words.shown].unit = words.shownUnit;
+  return {.options = options,
+          .grid = dates.Grid(),
+          .bands = bands,
+          .shown = words.shown,
+          .style = style,
+          .name = words.title};
 }
+
+// What is written for no-data, and which samples are no-data by their value.
+template <class Operator>
+void SetNoData(const ChangeOptions& options, const Dates& dates, Operator& change) {
+  change.SetNoData(static_cast<float>(options.NoDataValue()));
+  if (options.exclude.empty()) return;
+  const std::size_t channels = dates.afterBands.size();
+  change.SetRefNoData(std::vector(channels, static_cast<float>(options.exclude.front())));
+  change.SetImgNoData(std::vector(channels, static_cast<float>(options.exclude.back())));
+}
+
+// Runs an operator over the tiles. `finish` gets the mask of both dates and each tile of the output.
+template <class Operator, class Finish>
+void RunTiles(const ChangeOptions& options, const Dates& dates, GDALDataType type, const Operator& change,
+              const Words& words, Finish finish) {
+  const Readers readers(dates, type, options.tile);
+  RunJob(JobOf(options, dates, words), [&](const Tile& tile, Raster& out) {
+    LoadedTile before = readers.before.Read(tile), after = readers.after.Read(tile);
+    Mask* mask = Common(before, after);
+    change.Process(after.raster.get(), before.raster.get(), mask, &out);
+    finish(mask, out);
+  });
+}
+
+constexpr auto asItIs = [](Raster&) {};
 
 // Sets an operator up and runs it over the tiles. `finish` gets each tile of the output.
 template <class Operator, class Finish>
 void Run(const ChangeOptions& options, const Dates& dates, GDALDataType type, Operator& change,
          const Words& words, Finish finish) {
-  const Readers readers(dates, type, options.tile);
-  change.SetNoData(static_cast<float>(options.NoDataValue()));
-  if (!options.exclude.empty()) {
-    const std::size_t channels = dates.afterBands.size();
-    change.SetRefNoData(std::vector(channels, static_cast<float>(options.exclude.front())));
-    change.SetImgNoData(std::vector(channels, static_cast<float>(options.exclude.back())));
-  }
+  SetNoData(options, dates, change);
+  RunTiles(options, dates, type, change, words, [&](const Mask*, Raster& out) { finish(out); });
+}
+
+// Reads a date in its own type, which has to be one that the operators with two masks take.
+TileReader OwnReader(GDALDataset& dataset, const std::vector<int>& bands, const std::string& argument,
+                     std::uint32_t tile) {
+  const GDALDataType type = examples::RealTypeOf(dataset, bands);
+  TileReader reader({dataset, bands, argument, type}, 0, tile);
+  const bool taken = type == GDT_Byte || type == GDT_Int16 || type == GDT_UInt16 || type == GDT_Float32;
+  const bool signedBytes = reader.Type() == orvik::tessel::DataType::Of<char>();
+  if (taken && !signedBytes) return reader;
+  throw Refusal(argument,
+                std::string("has samples of ") + (signedBytes ? "signed bytes" : GDALGetDataTypeName(type)),
+                "Byte, Int16, UInt16 or Float32 with --two-masks");
+}
+
+// Sets an operator with two masks up and runs it over the tiles. A set bit of the reference's mask excludes.
+template <class Operator, class Finish>
+void RunTwoMasks(const ChangeOptions& options, const Dates& dates, Operator& change, const Words& words,
+                 Finish finish) {
+  const TileReader befores = OwnReader(*dates.before, dates.beforeBands, "BEFORE", options.tile);
+  const TileReader afters = OwnReader(*dates.after, dates.afterBands, "AFTER", options.tile);
+  SetNoData(options, dates, change);
   RunJob(JobOf(options, dates, words), [&](const Tile& tile, Raster& out) {
-    LoadedTile before = readers.before.Read(tile), after = readers.after.Read(tile);
-    change.Process(after.raster.get(), before.raster.get(), Common(before, after), &out);
+    LoadedTile before = befores.Read(tile), after = afters.Read(tile);
+    if (before.mask)
+      for (unsigned char& bits : before.mask->bits) bits = static_cast<unsigned char>(~bits);
+    change.Process(after.raster.get(), before.raster.get(), after.mask.get(), before.mask.get(), &out);
     finish(out);
   });
 }
-
-constexpr auto asItIs = [](Raster&) {};
 
 // The place among the compared bands that --show names, the first by default.
 std::size_t ShownBand(const ChangeOptions& options, const Dates& dates) {
@@ -286,8 +353,32 @@ void RunDifference(const ChangeOptions& options) {
   words.unit = UnitOf(dates);
   words.style.span = examples::Span::change;
   words.style.note = "after − before";
+  if (options.twoMasks) {
+    if (options.type != "Int16" && options.type != "Float32")
+      throw Refusal("--type", options.type + " is not written with --two-masks", "Int16 or Float32");
+    orvik::changedetection::ChanDiffChange2 difference(orvik::changedetection::eDIFF2_SIGNED);
+    return RunTwoMasks(options, dates, difference, words, asItIs);
+  }
   orvik::changedetection::ChanDiffChange difference(increase);
   Run(options, dates, type, difference, words, asItIs);
+}
+
+// The operator writes 0 for a masked pixel, which is a difference too.
+void RunSingle(const ChangeOptions& options) {
+  ChangeOptions one = options;
+  if (one.bands.empty()) one.bands = {1};
+  Dates dates = OpenDates(one);
+  ChooseBands(one, dates);
+  const GDALDataType type = CommonType(dates);
+  CheckHoldsDifferences(one, type);
+  Words words = WordsByBand("difference", one, dates);
+  words.unit = UnitOf(dates);
+  words.style.span = examples::Span::change;
+  words.style.note = "after − before";
+  const orvik::changedetection::SingleChange difference(singleIncrease);
+  RunTiles(one, dates, type, difference, words, [&](const Mask* mask, Raster& out) {
+    if (mask) examples::FillMasked(*mask, one.NoDataValue(), one.OutputType(), out);
+  });
 }
 
 // A zero in BEFORE gives an infinity or NaN.
@@ -304,9 +395,74 @@ void RunRatio(const ChangeOptions& options) {
   Words words = WordsByBand("ratio", options, dates);
   words.style.span = examples::Span::factor;
   words.style.note = "after / before, log scale";
+  const auto finish = [&](Raster& out) { FillWhereInfinite(static_cast<float>(options.NoDataValue()), out); };
+  if (options.twoMasks) {
+    orvik::changedetection::ChanRatioChange ratio(orvik::changedetection::eDIFF2_SIGNED);
+    return RunTwoMasks(options, dates, ratio, words, finish);
+  }
   orvik::changedetection::ChanRatioChange2 ratio(increase);
-  Run(options, dates, GDT_Float32, ratio, words,
-      [&](Raster& out) { FillWhereInfinite(static_cast<float>(options.NoDataValue()), out); });
+  Run(options, dates, GDT_Float32, ratio, words, finish);
+}
+
+// A mean of 0 after has a logarithm of minus infinity. One of 0 before has a ratio of 0 decibels by
+// definition of the operator, which is no ratio.
+void RunIntensity(const ChangeOptions& options) {
+  Dates dates = OpenDates(options);
+  ChooseBands(options, dates);
+  Words words{.title = "Change of intensity",
+              .bands = {"intensity after", "intensity before", "intensity ratio", "zero"},
+              .unit = UnitOf(dates),
+              .shownUnit = "dB",
+              .shown = 2};
+  words.style.span = examples::Span::change;
+  words.style.legend = "intensity";
+  words.style.note = "after / before";
+  const auto noData = static_cast<float>(options.NoDataValue());
+  orvik::changedetection::IntenRatioChange intensity(increase);
+  Run(options, dates, CommonType(dates), intensity, words, [&](Raster& out) {
+    auto* pixel = reinterpret_cast<float*>(out.data);
+    for (std::uint32_t i = 0; i < out.width * out.height; ++i, pixel += out.channels)
+      if (pixel[1] == 0.0f || std::isinf(pixel[2])) std::fill_n(pixel, out.channels, noData);
+  });
+}
+
+// "4 after" for the bands of AFTER, then those of BEFORE.
+std::vector<std::string> NamesOfBoth(const Dates& dates) {
+  std::vector<std::string> names;
+  for (const int band : dates.afterBands) names.push_back(std::to_string(band) + " after");
+  for (const int band : dates.beforeBands) names.push_back(std::to_string(band) + " before");
+  return names;
+}
+
+// Three bands of the output as red, green and blue, or one.
+void ShowBands(const std::vector<int>& asked, const std::vector<std::string>& names, Words& words) {
+  const auto count = static_cast<int>(words.bands.size());
+  std::vector<int> numbers;
+  for (int number = 1; number <= count; ++number) numbers.push_back(number);
+  for (const int band : asked)
+    if (band > count)
+      throw Refusal("--show", CPLSPrintf("there is no band %d in OUTPUT", band),
+                    CPLSPrintf("a band from 1 to %d", count));
+  const std::vector<int> places = examples::ShownPlaces(asked, numbers, "in OUTPUT");
+  words.shown = static_cast<std::size_t>(places.front());
+  if (places.size() == 1) return;
+  const std::string colours[] = {"red: ", "green: ", "blue: "};
+  for (std::size_t i = 0; i < places.size(); ++i)
+    words.style.composite.push_back({places[i] + 1, colours[i] + names[static_cast<std::size_t>(places[i])]});
+  words.style.legend = "bands";
+}
+
+void RunCombination(const ChangeOptions& options) {
+  Dates dates = OpenDates(options);
+  TakeBands(options, dates);
+  for (const auto& [argument, bands] : {std::pair("BEFORE", dates.beforeBands), {"AFTER", dates.afterBands}})
+    if (bands.empty()) throw Refusal(argument, "all bands are alpha bands", "a band with values");
+  Words words{.title = "Combination", .bands = {}, .unit = UnitOf(dates)};
+  const std::vector<std::string> names = NamesOfBoth(dates);
+  for (const std::string& name : names) words.bands.push_back("band " + name);
+  ShowBands(options.composite, names, words);
+  orvik::changedetection::CombChange combination(increase);
+  Run(options, dates, CommonType(dates), combination, words, asItIs);
 }
 
 // The output of the operators that write both dates and the difference.
@@ -379,8 +535,15 @@ const examples::OutputTypes signedTypes = {
 const examples::OutputTypes ratioTypes = {
     .names = {"Float32"}, .help = "Float32 and no other", .noDataHelp = "nan"};
 
-void AddChangeOptions(CLI::App& command, ChangeOptions& options, const examples::OutputTypes& types,
-                      const std::string& notes) {
+void AddTwoMasksOption(CLI::App& command, ChangeOptions& options, const std::string& types) {
+  command.add_flag("--two-masks", options.twoMasks,
+                   "by the operator that reads each date in its own type and with\n"
+                   "a mask of its own: Byte, Int16, UInt16 or Float32, to\n" +
+                       types);
+}
+
+void AddDates(CLI::App& command, ChangeOptions& options, const examples::OutputTypes& types,
+              const std::string& notes) {
   const auto add = [&](const char* name, std::string& path, const char* help) {
     command.add_option(name, path, help)->type_name("FILE")->required();
   };
@@ -388,12 +551,27 @@ void AddChangeOptions(CLI::App& command, ChangeOptions& options, const examples:
   add("AFTER", options.after, "the raster of the second date, on the same grid");
   AddOutputOptions(
       command, options, types,
-      "Positive is an increase from BEFORE to AFTER, negative a decrease.\n" + notes +
+      notes +
           "\n"
           "No-data: a pixel is left out of all bands where a no-data value, a mask band or an alpha band\n"
-          "of BEFORE or of AFTER says so, in any of the bands that are compared, and where a sample is NaN.\n"
-          "It holds the no-data value in OUTPUT and is transparent in the picture, whose colours reach as\n"
-          "far as 98 % of the values. OUTPUT appears under its name only when it is complete.\n");
+          "of BEFORE or of AFTER says so, in any of the bands that are read, and where a sample is NaN.\n"
+          "It holds the no-data value in OUTPUT and is transparent in the picture. OUTPUT appears under\n"
+          "its name only when it is complete.\n");
+}
+
+// For a measure that has a sign.
+void AddSignedDates(CLI::App& command, ChangeOptions& options, const examples::OutputTypes& types,
+                    const std::string& notes) {
+  AddDates(command, options, types,
+           "Positive is an increase from BEFORE to AFTER, negative a decrease. The colours of the picture\n"
+           "reach as far as 98 % of the values.\n" +
+               notes);
+}
+
+// For an operator that tests for no-data.
+void AddChangeOptions(CLI::App& command, ChangeOptions& options, const examples::OutputTypes& types,
+                      const std::string& notes) {
+  AddSignedDates(command, options, types, notes);
   command
       .add_option("--exclude", options.exclude,
                   "also leave out the samples of this value; two numbers stand\n"
@@ -417,7 +595,22 @@ Command AddDifference(CLI::App& app, ChangeOptions& options) {
                    "difference that the types of the inputs can give.\n");
   AddBandOptions(*command, options, "all but\nalpha bands");
   AddShowOption(*command, options);
+  AddTwoMasksOption(*command, options, "Int16 or Float32");
   return {command, RunDifference};
+}
+
+Command AddSingle(CLI::App& app, ChangeOptions& options) {
+  CLI::App* command = app.add_subcommand("single", "AFTER minus BEFORE of one band, in single precision");
+  AddSignedDates(
+      *command, options, signedTypes,
+      "An integer type must hold every difference that the types of the inputs can give. Samples of\n"
+      "32 and 64 bits are narrowed to single precision before the subtraction.\n");
+  const auto add = [&](const char* name, std::vector<int>& bands, const char* help) {
+    command->add_option(name, bands, help)->type_name("N")->expected(1)->check(examples::Count(1u << 16));
+  };
+  add("--bands", options.bands, "the band to compare; default: 1");
+  add("--before-bands", options.beforeBands, "the band of BEFORE, where it has another number");
+  return {command, RunSingle};
 }
 
 Command AddRatio(CLI::App& app, ChangeOptions& options) {
@@ -427,7 +620,30 @@ Command AddRatio(CLI::App& app, ChangeOptions& options) {
                    "pixel. A ratio to 0 is no-data. The colours are even in the logarithm of the ratio.\n");
   AddBandOptions(*command, options, "all but\nalpha bands");
   AddShowOption(*command, options);
+  AddTwoMasksOption(*command, options, "Float32");
   return {command, RunRatio};
+}
+
+Command AddIntensity(CLI::App& app, ChangeOptions& options) {
+  CLI::App* command =
+      app.add_subcommand("intensity", "mean of the bands of AFTER, of BEFORE, and their ratio in decibels");
+  AddChangeOptions(
+      *command, options, ratioTypes,
+      "OUTPUT has four bands: after, before, the ratio, which the picture shows, and one of zeros.\n"
+      "The value of --exclude in any band leaves out the pixel. A mean of 0 makes it no-data.\n");
+  AddBandOptions(*command, options, "all but\nalpha bands");
+  return {command, RunIntensity};
+}
+
+Command AddCombination(CLI::App& app, ChangeOptions& options) {
+  CLI::App* command =
+      app.add_subcommand("combine", "the bands of AFTER, then those of BEFORE, in one raster");
+  AddDates(*command, options, signedTypes,
+           "The numbers of --show are those of OUTPUT. A sample beyond the range of the type is limited to\n"
+           "it.\n");
+  AddBandOptions(*command, options, "all but\nalpha bands");
+  examples::AddShow(*command, options.composite);
+  return {command, RunCombination};
 }
 
 Command AddMagnitude(CLI::App& app, ChangeOptions& options) {
@@ -463,7 +679,12 @@ int main(int argc, char** argv) {
   app.require_subcommand(1);
   app.fallthrough(false);
   const Command commands[] = {
-      AddDifference(app, options), AddRatio(app, options), AddMagnitude(app, options),
+      AddDifference(app, options),
+      AddSingle(app, options),
+      AddRatio(app, options),
+      AddIntensity(app, options),
+      AddMagnitude(app, options),
+      AddCombination(app, options),
       AddTasseledCap(app, options, "greenness", RunTasseledCap<orvik::changedetection::TCGNChange>),
       AddTasseledCap(app, options, "brightness", RunTasseledCap<orvik::changedetection::TCSBChange>)};
   return examples::RunProgram(app, argc, argv, [&] {

@@ -1,10 +1,12 @@
-// How sharp a scene is, before and after a blur: focus scene.tif --blur 1,2
+// How sharp a scene is, before and after a blur: focus scene.tif --blur 1,2 --png focus.png
 
 #include <algorithm>
 #include <cstdio>
 #include <filesystem>
 #include <limits>
+#include <optional>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include <fcntl.h>
@@ -15,6 +17,8 @@
 #include "support/arguments.h"
 #include "support/errors.h"
 #include "support/job.h"
+#include "support/pendingfile.h"
+#include "support/picture.h"
 #include "support/tiles.h"
 
 namespace {
@@ -26,6 +30,8 @@ struct FocusOptions {
   std::string input;
   std::vector<int> bands;
   std::vector<int> blur = {1, 2};
+  std::string png;
+  std::string title;
 };
 
 // Marks a pixel without data. The operators' own masks count the pixels of a row and not their places, so
@@ -138,10 +144,13 @@ Sharpness Measure(Image& image) {
   return {vollath.GetLeftEq().front() - vollath.GetRightEq().front(), gradient.GetEvaluation().front()};
 }
 
-// A figure, and what part of that of the sharp image it is.
+// What part of the figure of the sharp image a figure is.
+std::string Part(double value, double sharp) {
+  return sharp == 0.0 ? "-" : CPLSPrintf("%.1f %%", 100.0 * value / sharp);
+}
+
 std::string Figure(double value, double sharp) {
-  const std::string part = sharp == 0.0 ? "-" : CPLSPrintf("%.1f %%", 100.0 * value / sharp);
-  return CPLSPrintf("%14.5e %8s", value, part.c_str());
+  return CPLSPrintf("%14.5e %8s", value, Part(value, sharp).c_str());
 }
 
 void PrintHead(const FocusOptions& options, GDALDataset& input) {
@@ -163,6 +172,49 @@ void PrintBand(int band, const std::vector<Sharpness>& images) {
   line("", "squared gradient", &Sharpness::gradient);
 }
 
+// The images as bands of a raster, for the picture.
+examples::DatasetPtr RasterOf(GDALDataset& input, std::vector<Image>& images) {
+  GDALDriver* driver = GetGDALDriverManager()->GetDriverByName("MEM");
+  const int width = input.GetRasterXSize(), height = input.GetRasterYSize();
+  examples::DatasetPtr raster(
+      driver->Create("", width, height, static_cast<int>(images.size()), GDT_Float64, nullptr));
+  examples::ThrowOnGdalError("laying the picture", raster ? CE_None : CE_Failure);
+  double transform[6];
+  if (input.GetGeoTransform(transform) == CE_None) raster->SetGeoTransform(transform);
+  if (const OGRSpatialReference* reference = input.GetSpatialRef()) raster->SetSpatialRef(reference);
+  for (std::size_t i = 0; i < images.size(); ++i)
+    examples::ThrowOnGdalError("laying the picture",
+                               raster->GetRasterBand(static_cast<int>(i) + 1)
+                                   ->RasterIO(GF_Write, 0, 0, width, height, images[i].samples.data(), width,
+                                              height, GDT_Float64, 0, 0, nullptr));
+  return raster;
+}
+
+// A map for each image, with what is left of both measures.
+void Draw(const FocusOptions& options, GDALDataset& input, std::vector<Image>& images,
+          const std::vector<Sharpness>& measures, const std::string& png) {
+  const std::filesystem::path path(options.input);
+  const examples::DatasetPtr raster = RasterOf(input, images);
+  std::vector<examples::Panel> panels;
+  for (std::size_t i = 0; i < images.size(); ++i) {
+    examples::Panel panel{.band = static_cast<int>(i) + 1, .quantity = {.name = "samples", .noData = hole}};
+    panel.style.title = options.title.empty() ? "Sharpness, " + path.stem().string() : options.title;
+    panel.style.caption = examples::DescribeGrid(path.filename().string(), input);
+    panel.style.legend = i == 0 ? "as it is" : CPLSPrintf("blurred, radius %d", options.blur[i - 1]);
+    panel.style.note = "Vollath " + Part(measures[i].vollath, measures[0].vollath);
+    panel.style.unit = "gradient " + Part(measures[i].gradient, measures[0].gradient);
+    panels.push_back(std::move(panel));
+  }
+  DrawPicture(*raster, panels, png);
+}
+
+void CheckPicture(const FocusOptions& options, GDALDataset& input, const std::vector<int>& bands) {
+  if (options.png.empty()) return;
+  examples::CheckTarget("--png", options.png, examples::FilesOf(input), {".png"});
+  if (bands.size() != 1)
+    throw Refusal("--png", std::to_string(bands.size()) + " bands are measured", "one, as with --bands 4");
+}
+
 void CheckSize(GDALDataset& input) {
   const auto pixels =
       static_cast<std::uint64_t>(input.GetRasterXSize()) * static_cast<std::uint64_t>(input.GetRasterYSize());
@@ -173,16 +225,25 @@ void CheckSize(GDALDataset& input) {
 void Run(const FocusOptions& options) {
   const examples::DatasetPtr input = examples::OpenRaster("INPUT", options.input);
   const std::vector<int> bands = examples::ChosenBands(options.bands, *input);
+  CheckPicture(options, *input, bands);
   CheckSize(*input);
+  std::optional<examples::PendingFile> picture;
+  if (!options.png.empty()) picture.emplace("--png", options.png);
   PrintHead(options, *input);
   for (const int band : bands) {
     Image image = ReadImage(*input, band);
-    std::vector<Sharpness> images = {Measure(image)};
+    std::vector<Sharpness> measures = {Measure(image)};
+    std::vector<Image> shown;
     for (const int radius : options.blur) {
       Image blurred = Blurred(image, static_cast<std::size_t>(radius));
-      images.push_back(Measure(blurred));
+      measures.push_back(Measure(blurred));
+      if (picture) shown.push_back(std::move(blurred));
     }
-    PrintBand(band, images);
+    PrintBand(band, measures);
+    if (!picture) continue;
+    shown.insert(shown.begin(), std::move(image));
+    Draw(options, *input, shown, measures, picture->TemporaryPath());
+    picture->Commit();
   }
 }
 
@@ -202,7 +263,7 @@ int main(int argc, char** argv) {
       "in memory, and its result is not rounded.\n"
       "\n"
       "No-data: a pixel of a band is left out where a no-data value, a mask band or an alpha band says\n"
-      "so, and where it is NaN. Nothing is written to files.\n"
+      "so, and where it is NaN. Nothing is written to files but the picture.\n"
       "\n"
       "Exit status: 0 done; 2 an argument was refused; 1 the work failed.");
   app.add_option("INPUT", options.input, "a raster that GDAL reads, of any pixel type")
@@ -215,5 +276,8 @@ int main(int argc, char** argv) {
       ->delimiter(',')
       ->expected(1, 8)
       ->check(examples::Count(1000));
+  app.add_option("--png", options.png, "also draw the band and its blurs into this file (.png); one band")
+      ->type_name("FILE");
+  app.add_option("--title", options.title, "title of the picture")->type_name("TEXT");
   return examples::RunProgram(app, argc, argv, [&] { Run(options); });
 }

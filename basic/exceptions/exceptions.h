@@ -48,6 +48,10 @@ struct GRIDMILL_EXPORT ParameterException : public DataException {
   /// @param kind       what is wrong with it
   /// @param given      the value that came, may be empty
   /// @param expected   the value that was expected, may be empty
+  /// @param message    what `what()` gives
+  /// @param file       the source file of the throw
+  /// @param function   the signature of the throwing function
+  /// @param line       the line of the throw
   ParameterException(const std::string& parameter, Type kind, const std::string& given,
                      const std::string& expected, const std::string& message, const std::string& file,
                      const std::string& function, unsigned int line);

@@ -94,6 +94,101 @@ TEST_F(Change, MagnitudeOfWideSamplesDoesNotWrap) {
   }
 }
 
+TEST_F(Change, SingleIsTheDifferenceOfOneBand) {
+  MakeDates(3);
+  ExpectDone("single before.tif after.tif out/s.tif --bands 2 --before-bands 3");
+  ASSERT_EQ(Open("out/s.tif")->GetRasterCount(), 1);
+  EXPECT_STREQ(Open("out/s.tif")->GetRasterBand(1)->GetDescription(), "difference of band 2 (3 before)");
+  const std::vector<double> values = Values("out/s.tif");
+  for (int y = 0; y < height; ++y)
+    for (int x = 0; x < width; ++x) ASSERT_EQ(values[At(x, y)], After(x, y, 2) - Before(x, y, 3));
+  ExpectDone("single before.tif after.tif out/first.tif --type Int16");
+  EXPECT_EQ(Values("out/first.tif")[At(8, 9)], After(8, 9, 1) - Before(8, 9, 1));
+}
+
+TEST_F(Change, IntensityHasBothMeansAndTheirRatioInDecibels) {
+  const auto before = [](int x, int, int b) { return x == 0 ? 0.0 : 5.0 * b; };
+  const auto after = [](int x, int, int b) { return x < 2 ? 0.0 : x == 2 ? 50.0 * b : 20.0 * b; };
+  Make("before.tif", {.bands = 3, .type = GDT_Byte, .value = before});
+  Make("after.tif", {.bands = 3, .type = GDT_Byte, .value = after});
+  ExpectDone("intensity before.tif after.tif out/i.tif --png out/i.png");
+  const DatasetPtr out = Open("out/i.tif");
+  ASSERT_EQ(out->GetRasterCount(), 4);
+  EXPECT_STREQ(out->GetRasterBand(3)->GetDescription(), "intensity ratio");
+  EXPECT_STREQ(out->GetRasterBand(3)->GetUnitType(), "dB");
+  EXPECT_STREQ(out->GetRasterBand(1)->GetUnitType(), "");
+  for (const int x : {0, 1})
+    for (const int band : {1, 2, 3, 4}) EXPECT_TRUE(std::isnan(Values("out/i.tif", band)[At(x, 7)])) << x;
+  const std::array<double, 4> tenfold = {100.0, 10.0, 10.0, 0.0};
+  for (const int band : {1, 2, 3, 4})
+    EXPECT_EQ(Values("out/i.tif", band)[At(2, 7)], tenfold[static_cast<std::size_t>(band) - 1]);
+  EXPECT_NEAR(Values("out/i.tif", 3)[At(9, 7)], 10.0 * std::log10(4.0), 1e-6);
+}
+
+TEST_F(Change, CombinationHasTheBandsOfAfterThenThoseOfBefore) {
+  Make("before.tif", {.bands = 2, .type = GDT_Byte, .value = Before});
+  Make("after.tif", {.bands = 3, .type = GDT_Int16, .value = After});
+  ExpectDone("combine before.tif after.tif out/c.tif --type Int16");
+  const DatasetPtr out = Open("out/c.tif");
+  ASSERT_EQ(out->GetRasterCount(), 5);
+  EXPECT_STREQ(out->GetRasterBand(3)->GetDescription(), "band 3 after");
+  EXPECT_STREQ(out->GetRasterBand(4)->GetDescription(), "band 1 before");
+  for (int band = 1; band <= 5; ++band)
+    EXPECT_EQ(Values("out/c.tif", band)[At(8, 9)], band <= 3 ? After(8, 9, band) : Before(8, 9, band - 3));
+  ExpectDone("combine before.tif after.tif out/two.tif --bands 3 --before-bands 2,1");
+  ASSERT_EQ(Open("out/two.tif")->GetRasterCount(), 3);
+  EXPECT_EQ(Values("out/two.tif", 1)[At(8, 9)], After(8, 9, 3));
+  EXPECT_EQ(Values("out/two.tif", 2)[At(8, 9)], Before(8, 9, 2));
+}
+
+TEST_F(Change, ACombinationNeedsBandsOfBothDates) {
+  MakeDates(1);
+  Make("alpha.tif", {.type = GDT_Byte});
+  DatasetPtr(GDALDataset::Open(Path("alpha.tif").c_str(), GDAL_OF_RASTER | GDAL_OF_UPDATE))
+      ->GetRasterBand(1)
+      ->SetColorInterpretation(GCI_AlphaBand);
+  ExpectRefused(CHANGE, "combine alpha.tif after.tif out/o.tif", "BEFORE: all bands are alpha bands");
+  ExpectRefused(CHANGE, "combine before.tif alpha.tif out/o.tif", "AFTER: all bands are alpha bands");
+}
+
+TEST_F(Change, TwoMasksGiveWhatOneGives) {
+  const auto value = [](int x, int y, int b) {
+    return (x + y) % 7 == 0 ? 255.0 : b == 2 && x % 9 == 4 ? 60.0 : Before(x, y, b);
+  };
+  Make("before.tif", {.bands = 2, .type = GDT_Byte, .value = value, .noData = 255.0});
+  Make("after.tif", {.bands = 2, .type = GDT_Int16, .value = After, .noData = 50.0});
+  for (const std::string task : {"difference", "ratio"}) {
+    ExpectDone(task + " before.tif after.tif out/one.tif --exclude 60,70");
+    ExpectDone(task + " before.tif after.tif out/two.tif --exclude 60,70 --two-masks --tile 16");
+    for (const int band : {1, 2}) {
+      const std::vector<double> one = Values("out/one.tif", band), two = Values("out/two.tif", band);
+      int values = 0, holes = 0;
+      for (std::size_t i = 0; i < one.size(); ++i) {
+        ASSERT_TRUE(one[i] == two[i] || (std::isnan(one[i]) && std::isnan(two[i]))) << task << " " << i;
+        ++(std::isnan(one[i]) ? holes : values);
+      }
+      EXPECT_GT(holes, 100);
+      EXPECT_GT(values, 1000);
+    }
+  }
+}
+
+TEST_F(Change, TwoMasksTakeFourTypes) {
+  const std::string task = "difference before.tif after.tif out/o.tif --two-masks";
+  Make("before.tif", {.type = GDT_Byte, .value = Before});
+  for (const GDALDataType type : {GDT_UInt32, GDT_Int32, GDT_Float64}) {
+    Make("after.tif", {.type = type, .value = After});
+    ExpectRefused(CHANGE, task,
+                  std::string("AFTER: has samples of ") + GDALGetDataTypeName(type) +
+                      "; expected Byte, Int16, UInt16 or Float32 with --two-masks");
+  }
+  Make("after.tif", {.type = GDT_Byte, .value = After});
+  ExpectRefused(CHANGE, task + " --type Int32",
+                "--type: Int32 is not written with --two-masks; expected Int16 or Float32");
+  ExpectDone(task + " --type Int16");
+  EXPECT_EQ(Values("out/o.tif")[At(8, 9)], After(8, 9, 1) - Before(8, 9, 1));
+}
+
 using Weights = std::vector<double>;
 const Weights greennessTm = {-0.2848, -0.2435, -0.5436, 0.7243, 0.084, -0.18};
 const Weights brightnessTm = {0.3037, 0.2793, 0.4343, 0.5585, 0.5082, 0.1863};
@@ -179,18 +274,35 @@ TEST_F(Change, NoDataOfEitherDateMasksAllBandsOfThePixel) {
         .type = GDT_Int16,
         .value = [](int x, int y, int b) { return AfterHole(x, y) && b == 4 ? -1.0 : After(x, y, b); },
         .noData = -1.0});
-  for (const std::string task : {"difference", "ratio", "magnitude", "greenness --sensor 'Landsat-5 TM'",
-                                 "brightness --sensor Ikonos --bands 1,2,3,4"}) {
+  for (const std::string task :
+       {"difference", "difference --two-masks", "single", "ratio", "ratio --two-masks", "intensity",
+        "combine", "magnitude", "greenness --sensor 'Landsat-5 TM'",
+        "brightness --sensor Ikonos --bands 1,2,3,4"}) {
+    // One band alone is masked by its own holes.
+    const auto masked = [&](int x, int y) {
+      return task == "single" ? false : BeforeHole(x, y) || AfterHole(x, y);
+    };
     ExpectDone(task + " before.tif after.tif out/o.tif");
     for (int band = 1; band <= Open("out/o.tif")->GetRasterCount(); ++band) {
       const std::vector<double> values = Values("out/o.tif", band);
       for (int y = 0; y < height; ++y)
         for (int x = 0; x < width; ++x)
-          ASSERT_EQ(std::isnan(values[At(x, y)]), BeforeHole(x, y) || AfterHole(x, y))
-              << task << " " << x << " " << y;
+          ASSERT_EQ(std::isnan(values[At(x, y)]), masked(x, y)) << task << " " << x << " " << y;
       EXPECT_TRUE(std::isnan(NoDataOf("out/o.tif", band)));
     }
   }
+}
+
+TEST_F(Change, AMaskedPixelOfASingleBandHoldsNoData) {
+  Make("before.tif",
+       {.value = [](int x, int y, int) { return BeforeHole(x, y) ? -5.0 : 3.0; }, .noData = -5.0});
+  Make("after.tif", {.value = [](int, int, int) { return 3.0; }});
+  ExpectDone("single before.tif after.tif out/o.tif --tile 16");
+  const std::vector<double> values = Values("out/o.tif");
+  for (int y = 0; y < height; ++y)
+    for (int x = 0; x < width; ++x)
+      ASSERT_EQ(std::isnan(values[At(x, y)]), BeforeHole(x, y)) << x << " " << y;
+  EXPECT_EQ(values[At(1, 0)], 0.0);
 }
 
 TEST_F(Change, ABandThatIsNotComparedMasksNothing) {
@@ -285,7 +397,8 @@ TEST_F(Change, UnlikeTypesAreReadInOneThatHoldsBoth) {
 TEST_F(Change, TilesOfAnySizeGiveTheSameOutput) {
   Make("before.tif", {.bands = 6, .type = GDT_Byte, .value = Before, .noData = 50.0});
   Make("after.tif", {.bands = 6, .type = GDT_Byte, .value = After, .noData = 60.0});
-  for (const std::string task : {"difference", "ratio", "magnitude", "greenness --sensor 'Landsat-7 ETM+'"}) {
+  for (const std::string task : {"difference", "single", "ratio", "intensity", "magnitude", "combine",
+                                 "greenness --sensor 'Landsat-7 ETM+'"}) {
     ExpectDone(task + " before.tif after.tif out/whole.tif");
     for (const int side : {1, 7, 64}) {
       ExpectDone(task + " before.tif after.tif out/tiled.tif --tile " + std::to_string(side));
@@ -342,6 +455,14 @@ TEST_F(Change, BadArgumentsAreRefusedBeforeAnythingIsWritten) {
                 "--before-bands: there is no band 3 in BEFORE");
   ExpectRefused(CHANGE, "ratio" + dates + " --bands 1 --show 2",
                 "--show: band 2 is not compared; expected one of 1");
+  ExpectRefused(CHANGE, "single" + dates + " --bands 3", "--bands: there is no band 3 in AFTER");
+  ExpectRefused(CHANGE, "combine" + dates + " --show 1,2,5",
+                "--show: there is no band 5 in OUTPUT; expected a band from 1 to 4");
+  ExpectRefused(CHANGE, "combine" + dates + " --show 1,2", "--show: two bands make no picture");
+  ExpectRefused(CHANGE, "intensity before.tif three.tif out/o.tif",
+                "AFTER: 3 bands are to be compared with 2 of BEFORE");
+  ExpectRefused(CHANGE, "single before.tif float.tif out/o.tif --type Int16",
+                "--type: differences of Float32 do not fit into Int16");
   ExpectRefused(CHANGE, "ratio" + dates + " --type Int16", "--type: 'Int16'");
   ExpectRefused(CHANGE, "magnitude" + dates + " --type Byte", "--type: 'Byte'");
   ExpectRefused(CHANGE, "difference before.tif float.tif out/o.tif --type Int32",
@@ -357,6 +478,9 @@ TEST_F(Change, BadArgumentsAreRefusedBeforeAnythingIsWritten) {
                 "OUTPUT: cannot write to folder 'none'");
   EXPECT_EQ(Run(CHANGE, "difference before.tif after.tif").status, 2);
   EXPECT_EQ(Run(CHANGE, "other" + dates).status, 2);
+  EXPECT_EQ(Run(CHANGE, "single" + dates + " --exclude 1").status, 2);
+  EXPECT_EQ(Run(CHANGE, "single" + dates + " --bands 1,2").status, 2);
+  EXPECT_EQ(Run(CHANGE, "combine" + dates + " --exclude 1").status, 2);
   EXPECT_TRUE(Outputs().empty());
 }
 
@@ -476,10 +600,24 @@ TEST_F(Change, ThePictureDivergesFromNoChange) {
                            return std::array{20.0, 60.0, 40.0, 255.0}[static_cast<std::size_t>(step(x))];
                          },
                      .noData = 255.0});
-  for (const std::string task : {"difference", "magnitude"}) {
+  for (const std::string task : {"difference", "single", "magnitude"}) {
     ExpectDone(task + " before.tif after.tif out/o.tif --png out/" + task + ".png");
     ExpectDiverging(*Open("out/" + task + ".png"));
   }
+}
+
+TEST_F(Change, ACombinationShowsTwoDatesAsColours) {
+  // Half of the columns are brighter after.
+  Make("before.tif", {.type = GDT_Byte, .value = [](int, int y, int) { return 2.0 * y; }});
+  Make("after.tif",
+       {.type = GDT_Byte, .value = [](int x, int y, int) { return x < 40 ? 250.0 - y : 2.0 * y; }});
+  const Outcome outcome = Run(CHANGE, "combine before.tif after.tif out/c.tif --show 1,2,2 --png out/c.png");
+  ASSERT_EQ(outcome.status, 0) << outcome.errors;
+  EXPECT_NE(outcome.output.find("Combination, 2 bands, 83 x 61 Float32"), std::string::npos)
+      << outcome.output;
+  const std::array<int, 4> brighter = ColourAt(*Open("out/c.png"), 10, 10);
+  EXPECT_GT(brighter[0], brighter[1] + 100);
+  EXPECT_EQ(brighter[1], brighter[2]);
 }
 
 TEST_F(Change, FiguresAndPictureAreThoseOfTheBandToShow) {
@@ -511,7 +649,8 @@ TEST_F(Change, GeoreferenceIsPreserved) {
 }
 
 TEST_F(Change, HelpSaysWhatTheSignMeans) {
-  for (const std::string task : {"difference", "ratio", "magnitude", "greenness", "brightness"}) {
+  for (const std::string task :
+       {"difference", "ratio", "intensity", "magnitude", "greenness", "brightness"}) {
     const Outcome outcome = Run(CHANGE, task + " --help");
     EXPECT_EQ(outcome.status, 0);
     for (const std::string word :

@@ -171,11 +171,27 @@ TEST_F(Focus, OnlyTheTableIsOnStandardOutput) {
   EXPECT_EQ(outcome.output.find("\n2 "), std::string::npos);
 }
 
+TEST_F(Focus, ThePictureShowsTheBandAndEachBlur) {
+  Make("scene.tif", {.width = 61, .height = 47, .type = GDT_Byte, .value = Count, .noData = 30.0});
+  const std::string task = "scene.tif --blur ";
+  const std::string without = Run(FOCUS, task + "1,2").output;
+  const Outcome two = Run(FOCUS, task + "1,2 --png out/two.png");
+  ASSERT_EQ(two.status, 0) << two.errors;
+  EXPECT_EQ(two.output, without);
+  ASSERT_EQ(Run(FOCUS, task + "1 --png out/one.png").status, 0);
+  ASSERT_EQ(Run(FOCUS, task + "9 --png out/wide.png").status, 0);
+  const DatasetPtr one = Open("out/one.png"), three = Open("out/two.png");
+  EXPECT_GT(three->GetRasterXSize() * one->GetRasterYSize(), one->GetRasterXSize() * three->GetRasterYSize());
+  EXPECT_NE(Bits("out/one.png"), Bits("out/wide.png"));
+}
+
 TEST_F(Focus, BadArgumentsAreRefusedBeforeAnythingIsPrinted) {
   Make("scene.tif", {.bands = 2, .type = GDT_Byte});
   for (const auto& [arguments, message] :
        {std::pair<std::string, std::string>{"missing.tif", "INPUT: missing.tif"},
         {"scene.tif --bands 3", "--bands: there is no band 3 in INPUT; expected a band from 1 to 2"},
+        {"scene.tif --png out/f.png", "--png: 2 bands are measured; expected one, as with --bands 4"},
+        {"scene.tif --bands 1 --png out/f.jpg", "--png: 'out/f.jpg'"},
         {"scene.tif --blur 0", "--blur: '0' is not usable; expected a whole number from 1 to 1000"},
         {"scene.tif --blur wide", "--blur: 'wide' is not usable; expected a whole number from 1 to 1000"}}) {
     ExpectRefused(FOCUS, arguments, message);
