@@ -22,7 +22,7 @@ TREE = HERE.parent
 
 
 def build_wheel(wheel_directory, config_settings=None, metadata_directory=None):
-    """Builds the wheel in `wheel_directory` and returns its name; CMake gets `CMAKE_ARGS` of the environment."""
+    """Builds the wheel in `wheel_directory` and returns its name. CMake gets what `CMAKE_ARGS` holds."""
     version = _version()
     python = f"cp{sys.version_info.major}{sys.version_info.minor}"
     tag = f"{python}-{python}-{re.sub('[-.]', '_', sysconfig.get_platform())}"
@@ -31,7 +31,6 @@ def build_wheel(wheel_directory, config_settings=None, metadata_directory=None):
         root = _install(pathlib.Path(folder))
         files = {path.relative_to(root).as_posix(): path.read_bytes() for path in _files(root)}
     info = f"gridmill-{version}.dist-info"
-    files[f"{info}/METADATA"] = _metadata(version).encode()
     files[f"{info}/WHEEL"] = (
         f"Wheel-Version: 1.0\nGenerator: gridmill\nRoot-Is-Purelib: false\nTag: {tag}\n".encode()
     )
@@ -59,7 +58,7 @@ def _install(folder):
         "GRIDMILL_BUILD_PYTHON": "ON",
         "GRIDMILL_BUILD_TESTS": "OFF",
         "GRIDMILL_PYTHON_BUNDLED": "ON",
-        "GRIDMILL_PYTHON_DIR": "gridmill",
+        "GRIDMILL_PYTHON_DIR": ".",
         "Python3_EXECUTABLE": sys.executable,
     }
     definitions = [f"-D{name}={value}" for name, value in settings.items()]
@@ -76,24 +75,6 @@ def _install(folder):
 
 def _files(root):
     return sorted(path for path in root.rglob("*") if path.is_file())
-
-
-def _metadata(version):
-    lines = [
-        "Metadata-Version: 2.1",
-        "Name: gridmill",
-        f"Version: {version}",
-        "Summary: Raster image operators for remote sensing, exact to the bit",
-        "Requires-Python: >=3.9",
-        "Requires-Dist: numpy >= 1.21",
-        "Provides-Extra: xarray",
-        'Requires-Dist: xarray >= 2023.1; extra == "xarray"',
-        "Provides-Extra: dask",
-        'Requires-Dist: dask[array] >= 2022.12; extra == "dask"',
-        'Requires-Dist: distributed >= 2022.12; extra == "dask"',
-        "Description-Content-Type: text/markdown",
-    ]
-    return "\n".join(lines) + "\n\n" + (TREE / "docs" / "python.md").read_text(encoding="utf-8")
 
 
 def _record(files, own):

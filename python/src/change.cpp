@@ -27,10 +27,12 @@ struct Needs {
   explicit Needs(const Op& op) : imgNoData(op.imgNoData.size()), refNoData(op.refNoData.size()) {}
 
   /// The no-data test of both dates runs if the image has as many bands as there are values for it.
-  void RequireNoData(const Image& image) const {
-    if (imgNoData == image.bands && refNoData < image.bands)
+  void RequireNoData(const Image& image, const Image& reference) const {
+    if (imgNoData != image.bands) return;
+    if (refNoData < image.bands)
       RaiseValue("refNoData", std::to_string(refNoData) + " entries",
                  std::to_string(image.bands) + ", as many as imgNoData");
+    reference.RequireBands(image.bands, "at least those of the image, which are tested for no-data");
   }
 
   std::size_t imgNoData = 0, refNoData = 0;
@@ -58,11 +60,12 @@ enum class Shape {
   kSamples,   ///< as many as the image has
   kCombined,  ///< writes those of both dates
   kThree,     ///< writes three
+  kAxes,      ///< reads of either date the bands of its sensor, writes three
   kFour,      ///< writes four
 };
 
 void RequireBands(Shape shape, const Image& image, const Image& reference, const Image& out) {
-  if (shape != Shape::kFirst && shape != Shape::kCombined)
+  if (shape == Shape::kSamples || shape == Shape::kThree || shape == Shape::kFour)
     reference.RequireBands(image.bands, "at least those of the image");
   switch (shape) {
     case Shape::kFirst:
@@ -72,6 +75,7 @@ void RequireBands(Shape shape, const Image& image, const Image& reference, const
     case Shape::kCombined:
       return out.RequireBands(image.bands + reference.bands, "those of both dates");
     case Shape::kThree:
+    case Shape::kAxes:
       return out.RequireBands(3, "at least 3");
     case Shape::kFour:
       return out.RequireBands(4, "at least 4");
@@ -112,7 +116,7 @@ void ProcessOneMask(Holder& self, const py::object& given, const py::object& giv
   const Needs needs = self.LimitsFor(types);
   image.RequireBands(needs.imageBands, "those of its sensor");
   reference.RequireBands(needs.referenceBands, "those of its sensor");
-  if (kShape != Shape::kFirst && kShape != Shape::kCombined) needs.RequireNoData(image);
+  if (kShape != Shape::kFirst && kShape != Shape::kCombined) needs.RequireNoData(image, reference);
   self.Run(types, needs, [&] {
     OverBands(image, reference, out,
               [&](std::size_t first, std::size_t rows, Raster& in, Raster& ref, Raster& target) {
@@ -138,7 +142,7 @@ void RunMixed(Holder& self, const Image& image, const Image& reference, const Im
   const auto lock = self.Enter();
   const CallTypes types = RealTypes(image, reference, out);
   const Needs needs = self.LimitsFor(types);
-  needs.RequireNoData(image);
+  needs.RequireNoData(image, reference);
   self.Run(types, needs, [&] { OverBands(image, reference, out, work); });
 }
 
@@ -226,7 +230,7 @@ void BindTasseledCap(py::module_& module, const char* name, const char* doc) {
   DefineChangeParameters<Holder>(type, static_cast<const Op*>(nullptr));
   Parameter<Holder>(type, "SetSensorType", &Op::SetSensorType, "sensorType", &Op::sensorType);
   Parameter<Holder>(type, "SetRefSensorType", &Op::SetRefSensorType, "refSensorType", &Op::refSensorType);
-  DefineOneMaskProcess<Holder>(type, &ProcessOneMask<Holder, Shape::kThree>);
+  DefineOneMaskProcess<Holder>(type, &ProcessOneMask<Holder, Shape::kAxes>);
 }
 
 void BindSingle(py::module_& module) {
