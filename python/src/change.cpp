@@ -111,7 +111,7 @@ void ProcessOneMask(Holder& self, const py::object& given, const py::object& giv
   RequireBands(kShape, image, reference, out);
   mask.RequireSizeOf(image);
   mask.RequireApart(out);
-  const auto lock = self.Enter();
+  const Turn turn = self.Enter();
   const CallTypes types{image.type, out.type};
   const Needs needs = self.LimitsFor(types);
   image.RequireBands(needs.imageBands, "those of its sensor");
@@ -139,7 +139,7 @@ template <class Holder, class Work>
 void RunMixed(Holder& self, const Image& image, const Image& reference, const Image& out, Work work) {
   RequirePlace(image, reference, out);
   RequireBands(Shape::kSamples, image, reference, out);
-  const auto lock = self.Enter();
+  const Turn turn = self.Enter();
   const CallTypes types = RealTypes(image, reference, out);
   const Needs needs = self.LimitsFor(types);
   needs.RequireNoData(image, reference);

@@ -24,7 +24,7 @@ void ProcessBitmap(Bitmap& self, const py::object& given, const py::object& give
   const Image image = Image::Read("image", given), out = Image::Written("out", givenOut);
   const Validity mask("mask", givenMask);
   RequireFit(image, mask, out);
-  const auto lock = self.Enter();
+  const Turn turn = self.Enter();
   RunOverBands(self, self.LimitsFor({image.type, out.type}), image, mask, out);
 }
 
@@ -123,7 +123,7 @@ void ProcessMirror(Mirror& self, const py::object& given, const py::object& give
   if (out.bands != image.bands)
     RaiseValue("out", std::to_string(out.bands) + " bands", std::to_string(image.bands) + ", as the image");
   RequireOneRaster({image, out});
-  const auto lock = self.Enter();
+  const Turn turn = self.Enter();
   const Flip flip = self.LimitsFor({image.type, out.type});
   RequireFlip(flip, image, mask, out);
   self.Run({image.type, out.type}, flip, [&] {
@@ -168,7 +168,7 @@ void ProcessIndices(Indices& self, const py::object& given, const py::object& gi
   const Image image = Image::Read("image", given), out = Image::Written("out", givenOut);
   const Validity mask("mask", givenMask);
   RequireFit(image, mask, out);
-  const auto lock = self.Enter();
+  const Turn turn = self.Enter();
   const Plan plan = self.LimitsFor({image.type, out.type});
   if (plan.roles < image.bands)
     RaiseValue("bandIndex", std::to_string(plan.roles) + " entries",

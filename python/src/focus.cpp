@@ -28,7 +28,7 @@ void ProcessFocus(Holder& self, const py::object& given, const py::object& given
   const Validity mask("mask", givenMask);
   mask.RequireSizeOf(image);
   RequireOneRaster({image});
-  const auto lock = self.Enter();
+  const Turn turn = self.Enter();
   const CallTypes types{image.type};
   Bands bands = self.LimitsFor(types);
   if (bands.count != 0 && bands.count != image.bands)
@@ -45,7 +45,7 @@ void ProcessFocus(Holder& self, const py::object& given, const py::object& given
 template <class Holder>
 void InitEvaluation(Holder& self, unsigned channels) {
   if (channels > kMostBands) RaiseValue("channels", std::to_string(channels), "at most 1048576");
-  const auto lock = self.Enter();
+  const Turn turn = self.Enter();
   self.op.InitEvaluation(channels);
 }
 

@@ -1,9 +1,12 @@
 #pragma once
 
 #include <array>
+#include <atomic>
 #include <memory>
 #include <mutex>
 #include <new>
+#include <stdexcept>
+#include <thread>
 #include <type_traits>
 #include <utility>
 
@@ -32,6 +35,30 @@ struct NoLimits {
   explicit NoLimits(const Op&) {}
 };
 
+/// A thread's turn with an object.
+class Turn {
+ public:
+  Turn(std::mutex& mutex, std::atomic<std::thread::id>& owner) : mutex_(mutex), owner_(owner) {
+    if (owner == std::this_thread::get_id())
+      throw std::runtime_error("the object is in the middle of a call; use another object");
+    if (!mutex_.try_lock()) {
+      const py::gil_scoped_release release;
+      mutex_.lock();
+    }
+    owner_ = std::this_thread::get_id();
+  }
+  ~Turn() {
+    owner_ = std::thread::id();
+    mutex_.unlock();
+  }
+  Turn(const Turn&) = delete;
+  Turn& operator=(const Turn&) = delete;
+
+ private:
+  std::mutex& mutex_;
+  std::atomic<std::thread::id>& owner_;
+};
+
 /// An operator of the core as a Python object holds it.
 ///
 /// The core reads its parameters when it builds an inner processor and compares nothing with them later. So
@@ -45,14 +72,10 @@ class Operator {
   explicit Operator(Arguments&&... arguments) : op(std::forward<Arguments>(arguments)...) {}
 
   /// One thread at a time: others wait, without holding the GIL.
-  std::unique_lock<std::mutex> Enter() {
-    std::unique_lock<std::mutex> lock(mutex_, std::try_to_lock);
-    if (!lock.owns_lock()) {
-      const py::gil_scoped_release release;
-      lock.lock();
-    }
-    return lock;
-  }
+  ///
+  /// @throws RuntimeError  where Python code that a call runs in between, a signal's handler or a decision,
+  ///                       turns to the object of that call
+  Turn Enter() { return Turn(mutex_, owner_); }
 
   /// The limits of the processor that a call with these types will run.
   Limits LimitsFor(const CallTypes& types, const char* firstArgument = "image") const {
@@ -96,6 +119,7 @@ class Operator {
   }
 
   std::mutex mutex_;
+  std::atomic<std::thread::id> owner_{};
   CallTypes types_;
   Limits limits_;
   bool built_ = false;
@@ -105,7 +129,7 @@ class Operator {
 template <class Holder, class Base, class Result, class... Arguments>
 auto Setter(Result (Base::*set)(Arguments...)) {
   return [set](Holder& self, std::decay_t<Arguments>... values) {
-    const auto lock = self.Enter();
+    const Turn turn = self.Enter();
     return (self.op.*set)(values...);
   };
 }
@@ -113,7 +137,7 @@ auto Setter(Result (Base::*set)(Arguments...)) {
 template <class Holder, class Base, class Value>
 auto Field(Value Base::*field) {
   return [field](Holder& self) {
-    const auto lock = self.Enter();
+    const Turn turn = self.Enter();
     return self.op.*field;
   };
 }

@@ -30,7 +30,7 @@ template <class Base>
 auto RegionSetter(void (Base::*set)(std::vector<unsigned>&)) {
   return [set](Transfer& self, std::vector<unsigned> region) {
     if (region.size() < 4) RaiseValue("region", std::to_string(region.size()) + " entries", "four");
-    const auto lock = self.Enter();
+    const Turn turn = self.Enter();
     (self.op.*set)(region);
   };
 }
@@ -45,7 +45,7 @@ void ProcessTransfer(Transfer& self, const py::object& given, const py::object& 
   out.RequireBands(image.type.isComplex && !out.type.isComplex ? 2 * image.bands : image.bands,
                    "at least the samples of the image");
   RequireOneRaster({image});
-  const auto lock = self.Enter();
+  const Turn turn = self.Enter();
   const CallTypes types{image.type, out.type};
   self.Run(types, self.LimitsFor(types), [&] {
     Raster in = image.Rows(0, image.height);
@@ -101,7 +101,7 @@ void ProcessBlue(Blue& self, const py::object& given, const py::object& givenMas
   const Validity mask("mask", givenMask);
   RequireFit(image, mask, out);
   if (out.bands == 3) image.RequireBands(2, "at least 2 for red and green");
-  const auto lock = self.Enter();
+  const Turn turn = self.Enter();
   const BlueRanges ranges = self.LimitsFor({image.type, out.type});
   if (ranges.backgrounds < image.bands)
     RaiseValue("backGround", std::to_string(ranges.backgrounds) + " entries",

@@ -57,7 +57,7 @@ void SetDecision(Holder& self, const py::object& given) {
     RaiseType("decision", py::repr(given).template cast<std::string>(), "a function of a pixel, or None");
   std::unique_ptr<Decision> decision;
   if (!given.is_none()) decision = std::make_unique<Decision>(py::reinterpret_borrow<py::function>(given));
-  const auto lock = self.Enter();
+  const Turn turn = self.Enter();
   self.op.SetMask(decision.get());
   if (decision != nullptr) self.decisions.push_back(std::move(decision));
 }
@@ -83,7 +83,7 @@ void ProcessStatistics(Statistics& self, const py::object& given, const py::obje
   const Image image = Image::Read("image", given, Types::kComplex);
   const Validity mask("mask", givenMask);
   mask.RequireSizeOf(image);
-  const auto lock = self.Enter();
+  const Turn turn = self.Enter();
   const CallTypes types{image.type, image.type};
   const Listed listed = self.LimitsFor(types);
   if (listed.synthetic) image.RequireBands(3, "at least 3 for a synthetic blue");
@@ -97,7 +97,7 @@ void ProcessStatistics(Statistics& self, const py::object& given, const py::obje
 }
 
 void SetChannels(Statistics& self, std::vector<unsigned> channels) {
-  const auto lock = self.Enter();
+  const Turn turn = self.Enter();
   if (self.op.channels.size() + channels.size() > kMostListed)
     RaiseValue("channels", std::to_string(self.op.channels.size() + channels.size()) + " channels",
                "at most " + std::to_string(kMostListed));
@@ -106,7 +106,7 @@ void SetChannels(Statistics& self, std::vector<unsigned> channels) {
 
 /// A second call lengthens the histograms, of which no bin beyond the first 65536 is ever counted.
 bool SetHistogramType(Statistics& self, int type) {
-  const auto lock = self.Enter();
+  const Turn turn = self.Enter();
   if (!self.op.histograms.empty() && self.op.histograms.front().size() >= (1u << 20))
     RaiseValue("type", "a histogram of " + std::to_string(self.op.histograms.front().size()) + " bins",
                "a new object");
@@ -114,7 +114,7 @@ bool SetHistogramType(Statistics& self, int type) {
 }
 
 py::array_t<int> PixelCounts(Statistics& self, int channel) {
-  const auto lock = self.Enter();
+  const Turn turn = self.Enter();
   if (self.Built() && (channel < 0 || static_cast<std::size_t>(channel) >= self.Last().bands))
     RaiseValue("channel", std::to_string(channel), "0 to " + std::to_string(self.Last().bands) + " - 1");
   const std::vector<int> counts = self.op.GetPixelCounts(channel);
@@ -124,7 +124,7 @@ py::array_t<int> PixelCounts(Statistics& self, int channel) {
 template <class Holder, class Base>
 auto Getter(void (Base::*get)(std::vector<float>&)) {
   return [get](Holder& self) {
-    const auto lock = self.Enter();
+    const Turn turn = self.Enter();
     std::vector<float> values;
     (self.op.*get)(values);
     return values;
@@ -170,7 +170,7 @@ using Classes = DecidingOperator<RangeClasses, Rebuilds::kOnAnyType, ClassRanges
 
 bool SetNumClasses(Classes& self, int count) {
   if (count > kMostClasses) RaiseValue("count", std::to_string(count), "at most 1048576");
-  const auto lock = self.Enter();
+  const Turn turn = self.Enter();
   return self.op.SetNumClasses(count);
 }
 
@@ -179,7 +179,7 @@ void ProcessClasses(Classes& self, const py::object& given, const py::object& gi
   const Image image = Image::Read("image", given), out = Image::Written("out", givenOut);
   const Validity mask("mask", givenMask);
   RequireFit(image, mask, out);
-  const auto lock = self.Enter();
+  const Turn turn = self.Enter();
   RunOverBands(self, self.LimitsFor({image.type, out.type}), image, mask, out);
 }
 

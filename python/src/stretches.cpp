@@ -38,7 +38,7 @@ void ProcessStretch(Holder& self, const py::object& given, const py::object& giv
   RequireFit(image, mask, out);
   if (out.bands != image.bands)
     RaiseValue("out", std::to_string(out.bands) + " bands", std::to_string(image.bands) + ", as the image");
-  const auto lock = self.Enter();
+  const Turn turn = self.Enter();
   const auto limits = self.LimitsFor({image.type, out.type});
   if (limits.bands < image.bands)
     RaiseValue("MinData, MaxData", "bounds of " + std::to_string(limits.bands) + " bands",
@@ -93,7 +93,7 @@ using Percent = Operator<Percentile, Rebuilds::kOnAnyType, Splines>;
 
 void SetPercentileCounts(Percent& self, const py::object& given) {
   std::vector<int> counts = CountsOf(given);
-  const auto lock = self.Enter();
+  const Turn turn = self.Enter();
   const std::size_t bins = BinsOf(self.op), bands = self.op.MaxData.size();
   if (self.op.MinData.size() < bands)
     RaiseValue("MinData", std::to_string(self.op.MinData.size()) + " entries", std::to_string(bands));
@@ -142,13 +142,13 @@ void ProcessIntensity(Inten& self, const py::object& given, const py::object& gi
   RequireFit(image, mask, out);
   image.RequireBands(3, "at least 3");
   out.RequireBands(4, "at least 4");
-  const auto lock = self.Enter();
+  const Turn turn = self.Enter();
   RunOverBands(self, self.LimitsFor({image.type, out.type}), image, mask, out);
 }
 
 void SetIntensityBins(Inten& self, const py::object& counts) {
   const std::vector<int> bins = CountsOf(counts);
-  const auto lock = self.Enter();
+  const Turn turn = self.Enter();
   self.op.SetBins(bins);
 }
 

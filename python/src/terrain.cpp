@@ -65,7 +65,7 @@ void ProcessTerrain(Holder& self, const py::object& given, const py::object& giv
   mask.RequireSizeOf(image);
   out.RequireApart(image);
   mask.RequireApart(out);
-  const auto lock = self.Enter();
+  const Turn turn = self.Enter();
   const CallTypes types = RealTypes(image, out);
   self.Run(types, self.LimitsFor(types), [&] {
     const Threads region(threads);
@@ -119,7 +119,7 @@ void ProcessAverage(Average& self, const py::object& given, const py::object& gi
   const Image out = Image::Written("out", givenOut);
   RequireThreads(threads);
   RequireFit(image, mask, out);
-  const auto lock = self.Enter();
+  const Turn turn = self.Enter();
   const CallTypes types = RealTypes(image, out);
   self.Run(types, self.LimitsFor(types), [&] {
     const Threads region(threads);
