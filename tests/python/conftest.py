@@ -12,6 +12,6 @@ COMMON = {
     "suppress_health_check": list(HealthCheck),
     "print_blob": False,
 }
-settings.register_profile("short", derandomize=True, max_examples=15, **COMMON)
+settings.register_profile("short", derandomize=True, max_examples=20, **COMMON)
 settings.register_profile("long", max_examples=int(os.environ.get("HYPOTHESIS_EXAMPLES", "4000")), **COMMON)
 settings.load_profile(os.environ.get("HYPOTHESIS_PROFILE", "short"))
