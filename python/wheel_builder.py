@@ -74,7 +74,12 @@ def _install(folder):
 
 
 def _files(root):
-    return sorted(path for path in root.rglob("*") if path.is_file())
+    """All files but the library under its full version: a wheel has no links, and the loader asks for the
+    short one."""
+    full_version = re.compile(r"libgridmill\.so\.\d+\..*")
+    return sorted(
+        path for path in root.rglob("*") if path.is_file() and not full_version.fullmatch(path.name)
+    )
 
 
 def _record(files, own):
