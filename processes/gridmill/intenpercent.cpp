@@ -5,6 +5,7 @@
 #include <cstdlib>
 #include <new>
 #include <type_traits>
+#include <utility>
 #include <vector>
 
 #include "basic/tessel/clipto.h"
@@ -124,8 +125,12 @@ template <class In, class Out>
 class IntenPercent::InnerProcessor : public IProcessor, public details::IntenPercentParams {
  public:
   void Process(tessel::Raster* in, tessel::Mask* mask, tessel::Raster* out) const override {
-    if (knots_.empty())
-      kernels::AppendKnots({cumulative, linear, quadratic, cubic}, binCount, Scale, Min, knots_);
+    if (knots_.empty()) {
+      // Apart, since a table of which a part is missing must not stay.
+      std::vector<kernels::Knot> knots;
+      kernels::AppendKnots({cumulative, linear, quadratic, cubic}, binCount, Scale, Min, knots);
+      knots_ = std::move(knots);
+    }
     // Deliberate: an excluded pixel holds `NoData` cast to the input's type.
     // The cast is volatile, as g++ takes it and the one that follows for one that keeps the sign of a zero.
     const volatile In cast = tessel::PlainCast<In>(NoData);

@@ -5,6 +5,8 @@
 #include <cstdint>
 #include <memory>
 #include <type_traits>
+#include <utility>
+#include <vector>
 
 #include "basic/core/typedispatch/extendtypedispatch.h"
 #include "basic/core/typedispatch/typelist.h"
@@ -143,9 +145,11 @@ class Percentile::InnerProcessor : public IProcessor, public details::Percentile
       if (met_ < channels * entries) return false;
       std::vector<In> every(entries);
       for (std::size_t i = 0; i < entries; ++i) every[i] = static_cast<In>(i);
-      tables_.resize(channels * entries);
+      // Apart, since tables that are not filled must not stay.
+      std::vector<Out> tables(channels * entries);
       for (std::size_t c = 0; c < channels; ++c)
-        FillTable(Splines(*this, c, 1), every, tables_.data() + c * entries);
+        FillTable(Splines(*this, c, 1), every, tables.data() + c * entries);
+      tables_ = std::move(tables);
       return true;
     }
     return false;

@@ -88,8 +88,9 @@ void SqrGradientEvaluation::Process(tessel::Raster* in, tessel::Mask* mask, tess
       *this, cache_, frame::Rasters<2>{in, out},
       [mask](const auto& processor, const auto& r) { processor.Process(r[0], mask, r[1]); });
 
-  const std::vector<double> totals =
-      dynamic_cast<const details::SqrGradientParams&>(*cache_.processor).GetEvaluation();
+  // Not a copy, which could fail after the totals have grown: a retry would add twice.
+  const std::vector<double>& totals =
+      dynamic_cast<const details::SqrGradientParams&>(*cache_.processor).evaluation;
   const std::size_t held = std::min(evaluation.size(), totals.size());
   // Deliberate: the running totals are added, not the sums of this call.
   for (std::size_t c = 0; c < held; ++c) evaluation[c] += totals[c];

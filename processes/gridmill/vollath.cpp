@@ -3,6 +3,8 @@
 #include <algorithm>
 #include <cstddef>
 #include <cstdint>
+#include <utility>
+#include <vector>
 
 #include "basic/core/typedispatch/extendtypedispatch.h"
 #include "basic/core/typedispatch/typelist.h"
@@ -85,13 +87,18 @@ VollathEvaluation& VollathEvaluation::operator=(const VollathEvaluation&) = defa
 VollathEvaluation::~VollathEvaluation() = default;
 
 void VollathEvaluation::Process(tessel::Raster* in, tessel::Mask* mask, tessel::Raster* out) const {
-  frame::Process<VollathFrame>(
-      *this, cache_, frame::Rasters<2>{in, out},
-      [mask](const auto& processor, const auto& r) { processor.Process(r[0], mask, r[1]); });
-
-  const auto& stats = dynamic_cast<const details::VollathStats&>(*cache_.processor);
-  SetLeftEvaluation(stats.GetLeftEq());
-  SetRightEvaluation(stats.GetRightEq());
+  frame::Process<VollathFrame>(*this, cache_, frame::Rasters<2>{in, out},
+                               [&](const auto& processor, const auto& r) {
+                                 // Room before the call, since nothing may fail after the totals have grown:
+                                 // a retry would add twice.
+                                 const auto& totals = dynamic_cast<const details::VollathStats&>(processor);
+                                 std::vector<double> left = totals.leftEq, right = totals.rightEq;
+                                 processor.Process(r[0], mask, r[1]);
+                                 left = totals.leftEq;
+                                 right = totals.rightEq;
+                                 SetLeftEvaluation(std::move(left));
+                                 SetRightEvaluation(std::move(right));
+                               });
 }
 
 }  // namespace orvik::filters
