@@ -1,0 +1,36 @@
+#include "processes/gridmill/filterslp.h"
+
+#include "fuzz/support/filtertarget.h"
+#include "tests/reference/filterslp_reference.h"
+
+namespace orvik::fuzz {
+namespace {
+
+using tessel::DataType;
+using tessel::Mask;
+using tessel::Raster;
+
+struct Target : FilterDefaults {
+  using Operator = filters::FilterSlp;
+  using Params = filters::details::SlpParams;
+  static constexpr std::uint32_t leastMargin = 1;
+  static constexpr bool isParallel = true;
+  static constexpr bool takesComplex = true;
+  static constexpr bool interprets = true;
+
+  static void Set(Bytes& bytes, Operator& op, std::uint32_t) {
+    op.SetXSIZE(FloatValue(bytes));
+    op.SetYSIZE(FloatValue(bytes));
+    op.SetELSZ(FloatValue(bytes));
+    op.SetBackground(FloatValue(bytes));
+  }
+  static void Twin(const Params& params, const DataType&, const DataType&, const Raster& in, const Mask* mask,
+                   Raster& out) {
+    reference::FilterSlp(params, in, mask, out);
+  }
+};
+
+}  // namespace
+}  // namespace orvik::fuzz
+
+GRIDMILL_FUZZ_FILTER(orvik::fuzz::Target)
