@@ -7,6 +7,7 @@
 #include <vector>
 
 #include "fuzz/support/bytes.h"
+#include "fuzz/support/digest.h"
 #include "fuzz/support/scene.h"
 #include "fuzz/support/values.h"
 #include "tests/support/changecases.h"
@@ -148,6 +149,7 @@ class ChangeSequence {
     const auto bits = BytesOf(dates.mask), secondBits = BytesOf(dates.referenceMask);
     Target::Twin(*held_, dates, expected);
     Target::Process(*op_, dates, &actual);
+    Observed().Add(actual, out_);
     Target::Settle(*held_, dates, expected, actual);
     RequireSame(expected, actual, out_);
     RequireUntouched(before, BytesOf(*dates.image));
@@ -167,19 +169,10 @@ class ChangeSequence {
 
 /// Runs one input of the fuzzer.
 template <class Target>
-int RunChange(const std::uint8_t* data, std::size_t size) {
-  Bytes bytes(data, size);
+void RunChange(Bytes& bytes) {
   const std::uint32_t calls = 1 + bytes.Below(4);
   ChangeSequence<Target> sequence(bytes);
   for (std::uint32_t i = 0; i < calls; ++i) sequence.Call();
-  return 0;
 }
 
 }  // namespace orvik::fuzz
-
-/// The entry point of a target.
-#define GRIDMILL_FUZZ_CHANGE(Target)                                                  \
-  extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size);  \
-  extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) { \
-    return orvik::fuzz::RunChange<Target>(data, size);                                \
-  }

@@ -8,6 +8,7 @@
 #include <omp.h>
 
 #include "fuzz/support/bytes.h"
+#include "fuzz/support/digest.h"
 #include "fuzz/support/scene.h"
 #include "fuzz/support/values.h"
 
@@ -15,6 +16,12 @@ namespace orvik::fuzz {
 
 /// Which change of types builds a new processor, to which alone the parameters go.
 enum class Rebuilds { kInputOrOutput, kInput, kNever };
+
+/// A number of threads, another one in each copy of a target in a program.
+inline int DrawThreads(Bytes& bytes) {
+  constexpr int kThreads[] = {1, 2, 5};
+  return kThreads[(bytes.Below(3) + GRIDMILL_FUZZ_COPY) % 3];
+}
 
 /// What the targets of one input and one output deviate in. A target derives from this and adds
 ///
@@ -117,9 +124,9 @@ class FilterSequence {
   void Compare(const Buffer& in, tessel::Mask* mask, const Buffer& expected, const Buffer& actual) {
     const std::vector<unsigned char> before = BytesOf(*in), bits = BytesOf(mask);
     Target::Twin(*held_, readAs_, writtenAs_, *in, mask, *expected);
-    constexpr int kThreads[] = {1, 2, 5};
-    if (Target::isParallel) omp_set_num_threads(bytes_.Pick(kThreads));
+    if (Target::isParallel) omp_set_num_threads(DrawThreads(bytes_));
     Target::Process(*op_, in.Get(), mask, actual.Get());
+    Observed().Add(*actual, writtenAs_);
     RequireSame(*expected, *actual, writtenAs_);
     RequireUntouched(before, BytesOf(*in));
     RequireUntouched(bits, BytesOf(mask));
@@ -136,19 +143,10 @@ class FilterSequence {
 
 /// Runs one input of the fuzzer.
 template <class Target>
-int RunFilter(const std::uint8_t* data, std::size_t size) {
-  Bytes bytes(data, size);
+void RunFilter(Bytes& bytes) {
   const std::uint32_t calls = 1 + bytes.Below(4);
   FilterSequence<Target> sequence(bytes);
   for (std::uint32_t i = 0; i < calls; ++i) sequence.Call();
-  return 0;
 }
 
 }  // namespace orvik::fuzz
-
-/// The entry point of a target.
-#define GRIDMILL_FUZZ_FILTER(Target)                                                  \
-  extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size);  \
-  extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) { \
-    return orvik::fuzz::RunFilter<Target>(data, size);                                \
-  }

@@ -8,6 +8,7 @@
 
 #include "basic/exceptions/exceptions.h"
 #include "fuzz/support/bytes.h"
+#include "fuzz/support/digest.h"
 #include "fuzz/support/scene.h"
 #include "fuzz/support/values.h"
 
@@ -21,6 +22,7 @@ inline void RequireSameSums(const std::vector<double>& expected, const std::vect
                                                 : std::memcmp(&expected[i], &actual[i], sizeof(double)) == 0;
     if (!isSame) Fail("a sum differs");
   }
+  Observed().Add(actual);
 }
 
 /// Runs one input of the fuzzer on a focus measure and its twin: calls with setters, clears, type changes and
@@ -28,8 +30,7 @@ inline void RequireSameSums(const std::vector<double>& expected, const std::vect
 ///
 /// @param compare  void(const Measure&, const Twin&)
 template <class Measure, class Twin, class Compare>
-int RunFocus(const std::uint8_t* data, std::size_t size, bool isInitialised, Compare compare) {
-  Bytes bytes(data, size);
+void RunFocus(Bytes& bytes, bool isInitialised, Compare compare) {
   const std::uint32_t channels = 1 + bytes.Below(6);
   auto measure = std::make_unique<Measure>();
   Twin twin;
@@ -71,7 +72,6 @@ int RunFocus(const std::uint8_t* data, std::size_t size, bool isInitialised, Com
     compare(*measure, twin);
     RequireUntouched(before, BytesOf(*in));
   }
-  return 0;
 }
 
 }  // namespace orvik::fuzz

@@ -31,4 +31,4 @@ struct Target : FilterDefaults {
 }  // namespace
 }  // namespace orvik::fuzz
 
-GRIDMILL_FUZZ_FILTER(orvik::fuzz::Target)
+GRIDMILL_FUZZ_TARGET(orvik::fuzz::RunFilter<orvik::fuzz::Target>)

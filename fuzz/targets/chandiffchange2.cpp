@@ -28,4 +28,4 @@ struct Target : ChangeDefaults {
 }  // namespace
 }  // namespace orvik::fuzz
 
-GRIDMILL_FUZZ_CHANGE(orvik::fuzz::Target)
+GRIDMILL_FUZZ_TARGET(orvik::fuzz::RunChange<orvik::fuzz::Target>)

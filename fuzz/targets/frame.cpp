@@ -6,6 +6,7 @@
 
 #include "basic/exceptions/exceptions.h"
 #include "fuzz/support/bytes.h"
+#include "fuzz/support/digest.h"
 #include "fuzz/support/scene.h"
 #include "fuzz/support/values.h"
 #include "processes/gridmill/gridmill.h"
@@ -58,6 +59,17 @@ struct Maker<filters::Normalize> {
   }
 };
 template <>
+struct Maker<filters::Percentile> {
+  static filters::Percentile Make() {
+    filters::Percentile percentile;
+    percentile.SetBinNum(4);
+    percentile.SetMinData(std::vector<float>(kChannels, 0.0f));
+    percentile.SetMaxData(std::vector<float>(kChannels, 100.0f));
+    percentile.SetCoefficients(std::vector<int>(std::size_t{4} * kChannels, 5));
+    return percentile;
+  }
+};
+template <>
 struct Maker<filters::VegIndex> {
   static filters::VegIndex Make() {
     filters::VegIndex index;
@@ -89,7 +101,7 @@ struct Maker<gridmill::SPOTBlue> {
 };
 
 template <class Op>
-void Run(const Op& op, const Call& call) {
+void Process(const Op& op, const Call& call) {
   if constexpr (requires { op.Process(call.in, call.reference, nullptr, nullptr, call.out); }) {
     op.Process(call.in, call.reference, nullptr, nullptr, call.out);
   } else if constexpr (requires { op.Process(call.in, call.reference, nullptr, call.out); }) {
@@ -116,11 +128,15 @@ Buffer RasterOf(const DataType& type, std::uint32_t margin) {
   return Buffer({3, 2, kChannels, type, {margin, margin}}, true);
 }
 
+/// An output, with the channels of both dates for CombChange.
+Buffer OutputOf(const DataType& type) { return Buffer({3, 2, 2 * kChannels, type, {}}, true); }
+
 /// The output of a call that has to succeed.
 template <class Op>
 std::vector<unsigned char> Output(const Op& op, const DataType& type) {
-  const Buffer in = RasterOf(type, 1), reference = RasterOf(type, 1), out = RasterOf(type, 0);
-  Run(op, {in.Get(), reference.Get(), out.Get()});
+  const Buffer in = RasterOf(type, 1), reference = RasterOf(type, 1), out = OutputOf(type);
+  Process(op, {in.Get(), reference.Get(), out.Get()});
+  Observed().Add(*out, type);
   return BytesOf(*out);
 }
 
@@ -134,11 +150,11 @@ void RunSequence(Bytes& bytes) {
     const DataType imageType = AnyType(bytes);
     const DataType referenceType = bytes.OneIn(2) ? AnyType(bytes) : imageType;
     const Buffer in = RasterOf(imageType, bytes.Below(2)), reference = RasterOf(referenceType, 1);
-    const Buffer out = RasterOf(AnyType(bytes), 0);
+    const Buffer out = OutputOf(AnyType(bytes));
     const std::uint32_t null = hasGuards ? bytes.Below(8) : 0;
     try {
-      Run(*op, {null == 5 ? nullptr : in.Get(), null == 6 ? nullptr : reference.Get(),
-                null == 7 ? nullptr : out.Get()});
+      Process(*op, {null == 5 ? nullptr : in.Get(), null == 6 ? nullptr : reference.Get(),
+                    null == 7 ? nullptr : out.Get()});
       isBuilt = true;
     } catch (const Exception&) {
     }
@@ -157,6 +173,7 @@ constexpr Sequence kSequences[] = {&RunSequence<filters::FilterSlp, true, true>,
                                    &RunSequence<filters::IntenPercent, false, true>,
                                    &RunSequence<gridmill::RangeClasses, false, true>,
                                    &RunSequence<filters::Normalize, false, true>,
+                                   &RunSequence<filters::Percentile, false, true>,
                                    &RunSequence<filters::VegIndex, false, true>,
                                    &RunSequence<filters::MirrorImg, false, true>,
                                    &RunSequence<gridmill::SPOTBlue, false, false>,
@@ -164,18 +181,16 @@ constexpr Sequence kSequences[] = {&RunSequence<filters::FilterSlp, true, true>,
                                    &RunSequence<ChanDiffChange2, true, true>,
                                    &RunSequence<ChanRatioChange, true, true>,
                                    &RunSequence<ChanRatioChange2, true, true>,
+                                   &RunSequence<CombChange, false, true>,
                                    &RunSequence<SingleChange, false, true>,
                                    &RunSequence<MagnitudeChange, false, true>,
                                    &RunSequence<IntenRatioChange, false, true>,
                                    &RunSequence<TCGNChange, false, true>,
                                    &RunSequence<TCSBChange, false, true>};
 
+void Run(Bytes& bytes) { bytes.Pick(kSequences)(bytes); }
+
 }  // namespace
 }  // namespace orvik::fuzz
 
-extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size);
-extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
-  orvik::fuzz::Bytes bytes(data, size);
-  bytes.Pick(orvik::fuzz::kSequences)(bytes);
-  return 0;
-}
+GRIDMILL_FUZZ_TARGET(orvik::fuzz::Run)

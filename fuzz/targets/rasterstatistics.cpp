@@ -5,6 +5,7 @@
 #include <vector>
 
 #include "fuzz/support/bytes.h"
+#include "fuzz/support/digest.h"
 #include "fuzz/support/scene.h"
 #include "fuzz/support/values.h"
 #include "tests/reference/rasterstatistics_reference.h"
@@ -32,8 +33,12 @@ void RequireSameResults(const reference::RasterStatistics& twin, gridmill::Raste
   statistics.GetMaxValue(maxima);
   RequireSameValues(twin.Minima(), minima);
   RequireSameValues(twin.Maxima(), maxima);
+  Observed().Add(minima);
+  Observed().Add(maxima);
   for (std::size_t i = 0; i < twin.Histograms().size(); ++i) {
-    if (statistics.GetPixelCounts(static_cast<int>(i)) != twin.Histograms()[i]) Fail("a histogram differs");
+    const std::vector<int> counts = statistics.GetPixelCounts(static_cast<int>(i));
+    if (counts != twin.Histograms()[i]) Fail("a histogram differs");
+    Observed().Add(counts);
   }
 }
 
@@ -75,9 +80,4 @@ void Run(Bytes& bytes) {
 }  // namespace
 }  // namespace orvik::fuzz
 
-extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size);
-extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
-  orvik::fuzz::Bytes bytes(data, size);
-  orvik::fuzz::Run(bytes);
-  return 0;
-}
+GRIDMILL_FUZZ_TARGET(orvik::fuzz::Run)

@@ -17,4 +17,4 @@ struct Target : TasseledCapDefaults<Target> {
 }  // namespace
 }  // namespace orvik::fuzz
 
-GRIDMILL_FUZZ_CHANGE(orvik::fuzz::Target)
+GRIDMILL_FUZZ_TARGET(orvik::fuzz::RunChange<orvik::fuzz::Target>)

@@ -2,13 +2,19 @@
 #include "processes/gridmill/vollath.h"
 #include "tests/reference/vollath_reference.h"
 
-extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size);
-extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
-  using Measure = orvik::filters::VollathEvaluation;
-  using Twin = orvik::reference::VollathEvaluation;
-  return orvik::fuzz::RunFocus<Measure, Twin>(
-      data, size, false, [](const Measure& measure, const Twin& twin) {
-        orvik::fuzz::RequireSameSums(twin.GetLeftEq(), measure.GetLeftEq());
-        orvik::fuzz::RequireSameSums(twin.GetRightEq(), measure.GetRightEq());
-      });
+namespace orvik::fuzz {
+namespace {
+
+void Run(Bytes& bytes) {
+  using Measure = filters::VollathEvaluation;
+  using Twin = reference::VollathEvaluation;
+  RunFocus<Measure, Twin>(bytes, false, [](const Measure& measure, const Twin& twin) {
+    RequireSameSums(twin.GetLeftEq(), measure.GetLeftEq());
+    RequireSameSums(twin.GetRightEq(), measure.GetRightEq());
+  });
 }
+
+}  // namespace
+}  // namespace orvik::fuzz
+
+GRIDMILL_FUZZ_TARGET(orvik::fuzz::Run)

@@ -8,6 +8,6 @@ extern "C" const char* __lsan_default_suppressions();
 extern "C" const char* __lsan_default_suppressions() {
   return "leak:libomp.so\n"
          "leak:libgomp.so\n"
-         "leak:orvik::filters::MirrorImg::Process\n"
-         "leak:orvik::filters::details::IntenPercentParams::SetCoefficients\n";
+         "leak:filters::MirrorImg::Process\n"
+         "leak:filters::details::IntenPercentParams::SetCoefficients\n";
 }
