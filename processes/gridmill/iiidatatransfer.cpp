@@ -92,6 +92,7 @@ struct Mapping {
     const auto& [outX, outY, outWidth, outHeight] = of.outRegion;
     const double sx = static_cast<double>(outWidth) / inWidth;
     const double sy = static_cast<double>(outHeight) / inHeight;
+    // cppcheck-suppress useInitializationList ; it needs the names above
     columns = Mapped({inX, outX, sx, in.originX, out.originX, in.width}, out.width);
     rows = Mapped({inY, outY, sy, in.originY, out.originY, in.height}, out.height);
   }

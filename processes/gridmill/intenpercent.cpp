@@ -178,6 +178,7 @@ struct IntenPercentFrame : frame::Defaults<details::IntenPercentParams> {
 /// Zeros that nobody frees.
 template <class Value>
 Value* Zeros(int count) {
+  // NOLINTNEXTLINE(cppcoreguidelines-no-malloc): no container owns what nobody frees
   void* const block = std::calloc(static_cast<std::size_t>(count), sizeof(Value));
   if (block == nullptr) throw std::bad_alloc();
   return static_cast<Value*>(block);

@@ -42,7 +42,7 @@ struct Square {
 };
 
 struct Root {
-  GRIDMILL_INLINE double Of(double sum) const { return std::sqrt(sum); }
+  GRIDMILL_INLINE static double Of(double sum) { return std::sqrt(sum); }
 };
 
 // ---- row

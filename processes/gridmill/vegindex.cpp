@@ -129,8 +129,8 @@ void WritePixels(const std::vector<std::size_t>& codes, const kernels::BandPlane
   if (codes.size() == 1) return WriteIndex<In>(codes.front(), bands, count, target);
   if constexpr (std::is_same_v<Out, float>) {
     if (codes.size() == kVegetationIndices)
-      return kNarrow<In> ? kernels::NarrowVegetationPixels(bands, count, target)
-                         : kernels::VegetationPixels(bands, count, target);
+      return (kNarrow<In>) ? kernels::NarrowVegetationPixels(bands, count, target)
+                           : kernels::VegetationPixels(bands, count, target);
   }
   Out planes[kVegetationIndices][kBlock];
   const Out* written[kVegetationIndices];

@@ -73,6 +73,7 @@ struct VollathFrame : frame::Defaults<details::VollathParams> {
 
   static void HandOver(const Params& from, Params& to, const frame::Rasters<2>& rasters) {
     to = from;
+    // NOLINTNEXTLINE(cppcoreguidelines-pro-type-static-cast-downcast): the dispatcher makes no other kind
     static_cast<VollathProcessor&>(to).InitEvaluation(rasters.front()->channels);
   }
 };

@@ -16,6 +16,7 @@ void Unpack(const std::vector<unsigned char>& bits, unsigned char* target, std::
   const std::size_t groups = pixels >> 3;
   for (std::size_t group = 0; group < groups; ++group) UnpackByte(bits[group], target + group * 8);
   for (std::size_t i = groups * 8; i < pixels; ++i)
+    // cppcheck-suppress constStatement ; it takes the braces for the end of the expression
     target[i] = kUnpackTable[std::size_t{bits[groups]} * 8 + (i & 7)];
 }
 

@@ -23,8 +23,10 @@ std::size_t BytesOf(const DataType& element) { return element.sizeBits / 8; }
 class PixelReader {
  public:
   PixelReader(const Raster& raster, const DataType& element, std::size_t samples, const BlockShape& shape)
-      : raster_(raster), bytes_(samples * BytesOf(element)), stride_(ElementsOf(raster)) {
-    inPlace_ = Holds(raster, element) && (!shape.dense || stride_ == samples);
+      : raster_(raster),
+        bytes_(samples * BytesOf(element)),
+        stride_(ElementsOf(raster)),
+        inPlace_(Holds(raster, element) && (!shape.dense || stride_ == samples)) {
     if (inPlace_) return;
     stride_ = samples;
     gathered_.resize(shape.pixels * bytes_);

@@ -6,6 +6,7 @@ namespace orvik::frame {
 
 namespace {
 
+// NOLINTNEXTLINE(cppcoreguidelines-avoid-non-const-global-variables): one lock for the whole process
 std::mutex scan;
 
 }  // namespace

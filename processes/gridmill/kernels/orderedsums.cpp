@@ -126,6 +126,7 @@ GRIDMILL_MULTIVERSION bool AddOneChannel(const double* terms, std::size_t length
     PutSideBySide(terms + g * kLanes * length, length, side + g * kLanes * length);
   const Start start(*sum);
   Runs<nonNegative> group[kGroups];
+  // cppcheck-suppress constVariable ; the braces on the right hide the assignment from it
   for (auto& runs : group) runs = {Lanes{} + start.Even(), Lanes{} + start.Odd()};
   AddRuns(side, kLanes, length, group);
   Resolved<nonNegative> resolved(*sum, start);

@@ -67,7 +67,9 @@ GRIDMILL_INLINE bool HasBin(Sample sample, std::size_t bins, std::size_t& bin) {
 
 /// Counts samples that all have a bin, every second one in a table that may be the same one.
 template <class Sample>
+// NOLINTNEXTLINE(readability-non-const-parameter): counted up by a subscript that depends on the type
 inline void CountAll(const Sample* samples, std::size_t stride, std::size_t count, std::uint32_t* even,
+                     // NOLINTNEXTLINE(readability-non-const-parameter): likewise
                      std::uint32_t* odd) {
   constexpr std::size_t together = 8;
   std::size_t i = 0;

@@ -251,7 +251,8 @@ bool IndexReads(std::size_t code, std::size_t role) {
 
 template <class Value>
 void VegetationRow(std::size_t code, const BandPlanes& bands, std::size_t count, Value* index) {
-  AllIndices::kRows<Value>[code](bands, count, index);
+  const auto& rows = AllIndices::kRows<Value>;
+  rows[code](bands, count, index);
 }
 
 void NarrowVegetationRow(std::size_t code, const BandPlanes& bands, std::size_t count, float* index) {
@@ -261,7 +262,8 @@ void NarrowVegetationRow(std::size_t code, const BandPlanes& bands, std::size_t 
       RowOf<Ndvi<float>, float, float>,  nullptr,
       RowOf<NarrowSavi, float, float>};
   const bool narrow = code < std::size(kRows) && kRows[code] != nullptr;
-  (narrow ? kRows[code] : AllIndices::kRows<float>[code])(bands, count, index);
+  const auto& rows = AllIndices::kRows<float>;
+  (narrow ? kRows[code] : rows[code])(bands, count, index);
 }
 
 void VegetationPixels(const BandPlanes& bands, std::size_t count, float* target) {
