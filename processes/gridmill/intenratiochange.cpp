@@ -88,8 +88,10 @@ class IntenRatioChange::InnerProcessor : public IChange, public details::IntenRa
     const kernels::PixelChoice choice(*this, m, n);
 
     double planes[4][kBlock];
-    auto& [S, T, D, zero] = planes;
-    std::fill_n(zero, kBlock, 0.0);
+    double* const S = planes[0];
+    double* const T = planes[1];
+    double* const D = planes[2];
+    std::fill_n(planes[3], kBlock, 0.0);
 
     const frame::BlockShape shape = frame::PixelBlocks(m, n, 4);
     frame::ChangeRows<In, In, Out>({*image, *reference, *out, mask}, shape, [&](const auto& block) {
