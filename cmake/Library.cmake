@@ -114,6 +114,8 @@ function(gridmill_objects name isa)
   elseif(NOT isa STREQUAL "auto")
     message(FATAL_ERROR "GRIDMILL_ISA is '${isa}'; expected auto, x86-64, x86-64-v3 or x86-64-v4")
   endif()
+  # The library alone: what a test instantiates for itself would hide what the library's own copy lacks.
+  target_compile_options(${name} PRIVATE ${GRIDMILL_COVERAGE_FLAGS})
 endfunction()
 
 gridmill_objects(gridmill_objects ${GRIDMILL_ISA})

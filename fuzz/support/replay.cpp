@@ -3,9 +3,8 @@
 #include <cstdint>
 #include <cstdio>
 #include <exception>
-#include <filesystem>
 #include <fstream>
-#include <iterator>
+#include <stdexcept>
 #include <string>
 #include <vector>
 
@@ -14,8 +13,6 @@
 #undef TARGET
 
 namespace {
-
-namespace fs = std::filesystem;
 
 struct Target {
   const char* name;
@@ -28,25 +25,28 @@ constexpr Target kTargets[] = {
 };
 #undef TARGET
 
-/// Runs a target on each file of its folder in the order of their names, and returns how many there were.
-std::size_t Replay(const Target& target, const fs::path& folder) {
-  std::vector<fs::path> files;
-  for (const auto& entry : fs::directory_iterator(folder)) files.push_back(entry.path());
-  std::sort(files.begin(), files.end());
-  for (const fs::path& path : files) {
-    std::ifstream file(path, std::ios::binary);
-    const std::vector<char> bytes{std::istreambuf_iterator<char>(file), {}};
-    std::fprintf(stderr, "%s\n", path.c_str());  // the last one, if it ends the process
-    target.run(reinterpret_cast<const std::uint8_t*>(bytes.data()), bytes.size());
+/// Runs a target on each input in the file of its corpus, and returns how many there were. An input stands
+/// behind its length, of two bytes with the higher one first.
+std::size_t Replay(const Target& target, const std::string& folder) {
+  std::ifstream file(folder + "/" + target.name + ".bin", std::ios::binary);
+  std::size_t replayed = 0;
+  unsigned char length[2];
+  while (file.read(reinterpret_cast<char*>(length), sizeof length)) {
+    std::vector<std::uint8_t> bytes(std::size_t{length[0]} * 256 + length[1]);
+    if (!file.read(reinterpret_cast<char*>(bytes.data()), static_cast<std::streamsize>(bytes.size())))
+      throw std::runtime_error(std::string(target.name) + ": the corpus ends within an input");
+    std::fprintf(stderr, "%s: input %zu\n", target.name, replayed);  // the last one, if it ends the process
+    target.run(bytes.data(), bytes.size());
+    ++replayed;
   }
-  return files.size();
+  return replayed;
 }
 
 }  // namespace
 
-/// Runs the targets on their folders of a corpus, all of them or those that are named, without a fuzzer. A
-/// difference ends the process behind the name of the file. An empty folder is a failure, as nothing would be
-/// tested.
+/// Runs the targets on their parts of a corpus, all of them or those that are named, without a fuzzer. A
+/// difference ends the process behind the number of the input. A part without inputs is a failure, as nothing
+/// would be tested.
 int main(int count, char** arguments) {
   if (count < 2) {
     std::fprintf(stderr, "usage: %s CORPUS [TARGET...]\n", arguments[0]);
@@ -57,7 +57,7 @@ int main(int count, char** arguments) {
   try {
     for (const Target& target : kTargets) {
       if (!wanted.empty() && std::find(wanted.begin(), wanted.end(), target.name) == wanted.end()) continue;
-      const std::size_t replayed = Replay(target, fs::path(arguments[1]) / target.name);
+      const std::size_t replayed = Replay(target, arguments[1]);
       std::fprintf(stderr, "%s: %zu inputs\n", target.name, replayed);
       if (replayed == 0) ++failures;
     }

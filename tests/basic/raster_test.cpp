@@ -134,6 +134,15 @@ TEST(Raster, ADefaultShapeIsEmpty) {
   EXPECT_EQ(context.originY, 0u);
 }
 
+TEST(Raster, AnAssignedShapeHoldsTheSame) {
+  RasterInfo info;
+  info = RasterInfo(3, 4, 5, DataType(eDT_16S, true));
+  EXPECT_EQ(info.width, 3u);
+  EXPECT_EQ(info.height, 4u);
+  EXPECT_EQ(info.channels, 5u);
+  EXPECT_EQ(info.dataType, DataType(eDT_16S, true));
+}
+
 // ---- addressing
 
 TEST(Raster, SamplesOfAPixelLieNextToEachOther) {

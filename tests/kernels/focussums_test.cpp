@@ -1,5 +1,6 @@
 #include "processes/gridmill/kernels/focussums.h"
 
+#include <algorithm>
 #include <bit>
 #include <cmath>
 #include <cstddef>
@@ -11,6 +12,7 @@
 #include <gtest/gtest.h>
 
 #include "processes/gridmill/kernels/countedsamples.h"
+#include "tests/attack/guardedpages.h"
 #include "tests/reference/focussample_reference.h"
 
 namespace orvik::kernels {
@@ -157,18 +159,29 @@ bool SameBits(const std::vector<double>& a, const std::vector<double>& b) {
   return a.size() == b.size();
 }
 
+/// The samples where no access behind the last one is possible.
+template <class In>
+const In* AtTheEnd(const attack::GuardedPages& pages, const std::vector<In>& samples) {
+  const std::size_t bytes = samples.size() * sizeof(In);
+  unsigned char* const place = pages.Place(bytes, true);
+  std::copy_n(reinterpret_cast<const unsigned char*>(samples.data()), bytes, place);
+  return reinterpret_cast<const In*>(place);
+}
+
 /// Three rows after each other into the same sums, which start with `start`.
 template <class In>
 void ExpectThePlainLoops(std::size_t channels, std::size_t pixels, const Bounds& b, double start,
                          std::mt19937_64& random) {
+  static const attack::GuardedPages pages[] = {attack::GuardedPages(1 << 19), attack::GuardedPages(1 << 19)};
   const FocusSums<In> fast{channels, CountedSamples<In>(b.low, b.high, b.failure)};
   std::vector<double> squares(channels, start), left = squares, right = squares;
   std::vector<double> slowSquares = squares, slowLeft = squares, slowRight = squares;
   for (int y = 0; y < 3; ++y) {
     const std::vector<In> upper = Samples<In>(channels * (pixels + 2), b, random);
     const std::vector<In> lower = Samples<In>(channels * pixels, b, random);
-    fast.AddSquaredDifferences(upper.data(), lower.data(), pixels, squares.data());
-    fast.AddNeighbourProducts(upper.data(), pixels, left.data(), right.data());
+    const In *const first = AtTheEnd(pages[0], upper), *const second = AtTheEnd(pages[1], lower);
+    fast.AddSquaredDifferences(first, second, pixels, squares.data());
+    fast.AddNeighbourProducts(first, pixels, left.data(), right.data());
     SlowSquares(upper.data(), lower.data(), channels, pixels, b, slowSquares);
     SlowProducts(upper.data(), channels, pixels, b, slowLeft, slowRight);
   }
@@ -210,6 +223,20 @@ TYPED_TEST(FocusSumsTest, SumsBeyond2To53AreRoundedTermByTerm) {
       ExpectThePlainLoops<TypeParam>(channels, 1100, kBounds[0], start, random);
     }
   }
+}
+
+TEST(FocusSums, EachOfTheTwoSumsOfProductsIsRoundedTermByTermBeyond2To53) {
+  const FocusSums<short> sums{1, CountedSamples<short>(-10, 10, -32767)};
+  const std::vector<short> row = {1, 1, 1, 1};
+  // 2^53 and 1 is halfway to the next number, and the even one is 2^53; 2^53 and 2 would be a number.
+  double left = 0.0, right = 0x1p53;
+  sums.AddNeighbourProducts(row.data(), 2, &left, &right);
+  EXPECT_EQ(left, 2.0);
+  EXPECT_EQ(right, 0x1p53);
+  left = 0x1p53, right = 0.0;
+  sums.AddNeighbourProducts(row.data(), 2, &left, &right);
+  EXPECT_EQ(left, 0x1p53);
+  EXPECT_EQ(right, 2.0);
 }
 
 TEST(CountSetInBoth, CountsTheBitsThatAreSetInBothRuns) {

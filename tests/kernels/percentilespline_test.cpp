@@ -2,6 +2,7 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <limits>
 #include <vector>
 
 #include <gtest/gtest.h>
@@ -19,11 +20,24 @@ struct Spline {
 
   Spline(std::vector<double> percentages, double binsPerUnit)
       : bins(static_cast<int>(percentages.size()) - 2), scale(binsPerUnit), cumulative(percentages) {
+    Solve(0.0);
+  }
+
+  /// Fills the tables, which hold `before` until then.
+  void Solve(double before) {
     for (std::vector<double>* table : {&alpha, &linear, &quadratic, &cubic, &diagonal, &mu, &z})
-      table->resize(percentages.size());
+      table->assign(cumulative.size(), before);
     SolveSpline({cumulative.data(), alpha.data(), linear.data(), quadratic.data(), cubic.data(),
                  diagonal.data(), mu.data(), z.data()},
                 bins, scale);
+  }
+
+  /// The coefficients of all bins.
+  std::vector<double> Coefficients() const {
+    std::vector<double> all;
+    for (const std::vector<double>* table : {&linear, &quadratic, &cubic})
+      all.insert(all.end(), table->begin(), table->begin() + bins + 1);
+    return all;
   }
 
   std::vector<Knot> Knots(double least) const {
@@ -44,6 +58,13 @@ TEST(PercentileSpline, SystemIsItsOwnAndNotTheNaturalOne) {
   EXPECT_EQ(spline.z[2], -150.0 / 3.5);
   EXPECT_EQ(spline.quadratic[2], -150.0 / 3.5);
   EXPECT_EQ(spline.quadratic[1], 0.25 * (150.0 / 3.5));
+}
+
+TEST(PercentileSpline, TablesNeedNotBeClearedBefore) {
+  Spline spline({0.0, 3.0, 4.5, 70.25, 99.0, 100.0, 100.0}, 0.3);
+  const std::vector<double> expected = spline.Coefficients();
+  spline.Solve(std::numeric_limits<double>::quiet_NaN());
+  EXPECT_EQ(spline.Coefficients(), expected);
 }
 
 TEST(PercentileSpline, ValueOnAnEdgeGivesTheKnot) {

@@ -8,9 +8,10 @@
 
 #include <gtest/gtest.h>
 
+#include "tests/attack/guardedpages.h"
 #include "tests/support/random.h"
 
-// Pixels one after the other. Rows end with the last byte that may be read, for the sanitizers to see.
+// Pixels one after the other. Rows end with the last byte that can be read.
 namespace orvik::kernels {
 namespace {
 
@@ -61,7 +62,7 @@ Columns ColumnsOf(Order order, std::size_t count, std::uint32_t rowPixels, tests
   return columns;
 }
 
-/// A choice from a row of random bytes.
+/// A choice from a row of random bytes. All rows lie at the same place, one after the other.
 class Choice {
  public:
   Choice(Columns columns, std::size_t pixelBytes, std::uint32_t rowPixels, std::size_t offset,
@@ -69,9 +70,9 @@ class Choice {
       : columns_(std::move(columns)),
         pixelBytes_(pixelBytes),
         offset_(offset),
-        row_(offset + rowPixels * pixelBytes),
+        row_(pages.Place(rowPixels * pixelBytes, true)),
         gather_(columns_, pixelBytes, rowPixels) {
-    for (auto& byte : row_) byte = static_cast<unsigned char>(random.Bits());
+    std::generate_n(row_, rowPixels * pixelBytes, [&] { return static_cast<unsigned char>(random.Bits()); });
   }
 
   void ExpectTaken(std::size_t from, std::size_t count) const {
@@ -79,8 +80,8 @@ class Choice {
     const std::size_t first = kGuard + offset_;
     for (std::size_t i = 0; i < count; ++i)
       for (std::size_t b = 0; b < pixelBytes_; ++b)
-        expected[first + i * pixelBytes_ + b] = row_[offset_ + columns_[from + i] * pixelBytes_ + b];
-    gather_.Take(row_.data() + offset_, from, count, target.data() + first);
+        expected[first + i * pixelBytes_ + b] = row_[columns_[from + i] * pixelBytes_ + b];
+    gather_.Take(row_, from, count, target.data() + first);
     ASSERT_EQ(target, expected) << count << " of " << columns_.size() << " pixels of " << pixelBytes_
                                 << " bytes from " << from << " on";
   }
@@ -92,12 +93,14 @@ class Choice {
   }
 
   const PixelGather& Gather() const { return gather_; }
-  const unsigned char* Row() const { return row_.data() + offset_; }
+  const unsigned char* Row() const { return row_; }
 
  private:
+  static inline const attack::GuardedPages pages{1 << 16};
+
   Columns columns_;
   std::size_t pixelBytes_, offset_;
-  Bytes row_;
+  unsigned char* row_;
   PixelGather gather_;
 };
 

@@ -23,5 +23,15 @@ TEST(ReversePixels, EveryPixelSizeAndLength) {
   }
 }
 
+TEST(ReversePixels, OfNoPixelsOrOfPixelsWithoutBytesWritesNothing) {
+  const std::vector<unsigned char> source(64, 1);
+  for (const std::size_t bytes : {0u, 1u, 2u, 3u, 4u, 5u, 8u, 16u}) {
+    std::vector<unsigned char> target(64, 0xA5);
+    ReversePixels(source.data(), bytes, 0, target.data());
+    ReversePixels(source.data(), 0, bytes, target.data());
+    EXPECT_EQ(target, std::vector<unsigned char>(64, 0xA5)) << bytes;
+  }
+}
+
 }  // namespace
 }  // namespace orvik::kernels

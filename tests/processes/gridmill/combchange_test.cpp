@@ -379,6 +379,22 @@ TEST(CombChange, RealImageOrdersBeforeItsComplexVariant) {
   EXPECT_EQ(std::vector<int>(&out.At(1, 0), &out.At(1, 0) + 4), (std::vector<int>{12, 0, 5, 6}));
 }
 
+TEST(CombChange, RealImageBesideItsComplexVariantReads0ForEveryPairOfTypesButOf16Bits) {
+  for (const PixelType& type : tests::kPixelTypes) {
+    for (const PixelType& written : tests::kPixelTypes) {
+      tests::WithPixelTypes(type.element, written.element, [&]<class In, class Out>() {
+        Image<In> image({2, 1}, {}, In('1')), reference({2, 1}, {}, In(6), true);
+        Image<Out> out({2, 1, 2}, {}, Out(77));
+        CombChange(eDIFF_FORWARD).Process(&image, &reference, nullptr, &out);
+        const Out spelt = sizeof(In) == 2 ? Out(1) : Out(0);
+        EXPECT_EQ(std::vector<Out>(out.Elements(), out.Elements() + 4),
+                  (std::vector<Out>{spelt, 6, spelt, 6}))
+            << type << " to " << written;
+      });
+    }
+  }
+}
+
 TEST(CombChange, ComplexOutputGetsItsFirstElementsWritten) {
   Image<short> image({2, 1}, {}, 5), reference({2, 1}, {}, 6);
   Image<short> out({2, 1, 2}, {}, 77, true);

@@ -272,6 +272,16 @@ TEST(IIIDataTransfer, OutputOfHeightOrWidth0IsUntouched) {
   }
 }
 
+TEST(IIIDataTransfer, InputOfHeightOrWidthOrChannels0LeavesTheOutputUntouched) {
+  for (const Size size : {Size{4, 0}, Size{0, 4}, Size{0, 0}, Size{4, 4, 0}}) {
+    Image<short> in(size, {1, 1}, 5);
+    Image<short> out({4, 4}, {1, 1});
+    FillBytes(out);
+    Straight().Process(&in, nullptr, &out);
+    EXPECT_TRUE(IsUntouched(out));
+  }
+}
+
 TEST(IIIDataTransfer, MaskIsIgnored) {
   Image<short> in({5, 3}, {1, 1}, 5);
   Mask excluding(5, 3, {1, 1}, false);
@@ -473,6 +483,23 @@ TEST(IIIDataTransfer, WiderElementsOfTheFirstOutputOverlapInALaterOneTheNextPixe
     std::vector<unsigned char> expected(5 * width, 77);
     std::fill_n(expected.begin() + width, 3 * width, static_cast<unsigned char>(5));
     std::fill_n(expected.begin() + 4 * width, 3, static_cast<unsigned char>(0));
+    EXPECT_TRUE(ElementsOf(later) == expected) << width;
+  }
+}
+
+TEST(IIIDataTransfer, MoreElementsThanALaterOutputsPixelHoldsOverlapTheNextPixelAndTheNextRowPrevail) {
+  const IIIDataTransfer transfer = Straight();
+  Image<short> in({1, 1}, {}, 5), first({1, 1});
+  transfer.Process(&in, nullptr, &first);
+  for (const unsigned int width : {2u, 5000u}) {
+    Image<short> complex({width, 1}, {}, 0, true);
+    complex.Set([](int x, int, std::uint32_t c) { return c == 0 ? x : -x; });
+    Image<short> later({width, 3}, {0, 1}, 77);
+    transfer.Process(&complex, nullptr, &later);
+    std::vector<short> expected(width, 77);
+    for (unsigned int i = 0; i < 3 * width; ++i) expected.push_back(static_cast<short>(i % width));
+    expected.push_back(static_cast<short>(1 - static_cast<int>(width)));
+    expected.resize(5 * width, 77);
     EXPECT_TRUE(ElementsOf(later) == expected) << width;
   }
 }

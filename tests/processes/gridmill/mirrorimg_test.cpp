@@ -151,7 +151,7 @@ TEST(MirrorImg, AnyOtherAxisWritesNothing) {
   FillBytes(out);
   for (const char* const axis :
        {"", "V", "VER", "VERTICAL", "VERT ", " VERT", "VERTHORI", "HOR", "HORIZONTAL", "hori\n", "VORI",
-        "TREV", "\xD6\xC5\xD2\xD4", "a long text that is no axis"}) {
+        "TREV", "{ert", "HOR|", "hor~", "\xD6\xC5\xD2\xD4", "a long text that is no axis"}) {
     for (const bool isNewFile : {false, true}) {
       Mirror(axis, isNewFile).Process(&in, nullptr, &out);
       EXPECT_TRUE(IsUntouched(out)) << axis;

@@ -2,12 +2,14 @@
 
 #include <cmath>
 #include <cstdint>
+#include <cstring>
 #include <limits>
 #include <vector>
 
 #include <gtest/gtest.h>
 
 #include "basic/exceptions/exceptions.h"
+#include "tests/attack/guardedpages.h"
 #include "tests/reference/singlechange_reference.h"
 #include "tests/support/changecases.h"
 #include "tests/support/changepixel.h"
@@ -158,6 +160,18 @@ TEST(SingleChange, ReferenceOfAnotherTypeIsReadAsTheTypeOfTheImage) {
   op.Process(&image, &narrow, nullptr, &out);
   EXPECT_EQ(out.At(0, 0), 3 + 256 - 1);
   EXPECT_EQ(out.At(1, 0), 1 + 2 * 256 - 1);
+}
+
+TEST(SingleChange, ReferenceOfAnotherTypeIsNotReadBehindItsLastSample) {
+  const attack::GuardedPages pages(1);
+  const float samples[] = {10.0f, 20.0f, 30.0f};
+  Raster bits({3, 1, 1, tessel::eDT_32S}, {}, pages.Place(sizeof(samples), true));
+  std::memcpy(bits.data, samples, sizeof(samples));
+  Image<float> image({3, 1}, {}, 1.0f), out({3, 1});
+  SingleChange(eDIFF_FORWARD).Process(&image, &bits, nullptr, &out);
+  EXPECT_EQ(out.At(0, 0), 9.0f);
+  EXPECT_EQ(out.At(1, 0), 19.0f);
+  EXPECT_EQ(out.At(2, 0), 29.0f);
 }
 
 TEST(SingleChange, ComplexRastersAreReadAndWrittenByTheirFirstElement) {

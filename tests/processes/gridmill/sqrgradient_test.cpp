@@ -436,6 +436,16 @@ TEST(SqrGradient, FewerChannelsInALaterCallAddTheOtherTotalsOnceMore) {
   EXPECT_EQ(measure.GetEvaluation(), (Sums{9 + 10, 9 + 9, 9 + 9}));
 }
 
+TEST(SqrGradient, MoreChannelsInALaterCallArePrintedButHaveNoTotal) {
+  SqrGradientEvaluation measure;
+  measure.InitEvaluation(3);
+  Step<short> two(3, 2), three(1, 3);
+  Process(measure, &two);
+  EXPECT_EQ(Process(measure, &three),
+            "\n BEFORE - 101 1.000000\n\n BEFORE - 101 1.000000\n\n BEFORE - 101 1.000000\n");
+  EXPECT_EQ(measure.GetEvaluation(), (Sums{9 + 10, 9 + 10, 0}));
+}
+
 TEST(SqrGradient, NullOutputWorksAndNoOutputIsTouched) {
   Step<short> in(3);
   for (const DataType type :

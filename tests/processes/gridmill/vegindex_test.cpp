@@ -457,6 +457,26 @@ TEST(VegIndex, LargerOutputKeepsItsOtherPixelsAndChannels) {
   }
 }
 
+TEST(VegIndex, InputThatCountsAsLargerThanTheCachesHasTheSameIndices) {
+  for (const bool alone : {false, true}) {
+    Image<unsigned short> in({700, 2, 4});
+    in.Set([](int x, int y, std::uint32_t c) { return (y + 3) * (c == 2 ? x % 7 + 2 : 1); });
+    in.dataSize = std::uint64_t{1} << 30;
+    const std::uint32_t indices = alone ? 1 : 2;
+    Image<float> out({700, 2, indices});
+    OperatorOf(RequestsOf(alone ? Codes{eINDEX_RVI} : Codes{eINDEX_DVI, eINDEX_RVI}),
+               {eBAND_GREEN, eBAND_RED, eBAND_NIR, eBAND_BLUE})
+        .Process(&in, nullptr, &out);
+    for (int x = 0; x < 700; ++x) {
+      for (int y = 0; y < 2; ++y) {
+        const int ratio = x % 7 + 2, difference = (y + 3) * (ratio - 1);
+        ASSERT_EQ(out.At(x, y, indices - 1), static_cast<float>(ratio)) << x << ", " << y;
+        ASSERT_EQ(out.At(x, y), static_cast<float>(alone ? ratio : difference)) << x << ", " << y;
+      }
+    }
+  }
+}
+
 TEST(VegIndex, ParametersAreEmptyByDefault) {
   const VegIndex index;
   EXPECT_TRUE(index.requestedIndex.empty());
