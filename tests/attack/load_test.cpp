@@ -1,4 +1,5 @@
 #include <algorithm>
+#include <cmath>
 #include <cstddef>
 #include <cstdint>
 #include <memory>
@@ -86,6 +87,12 @@ testing::AssertionResult IsChannel(const Result& many, std::uint32_t c, const Re
 }
 
 constexpr std::uint32_t kMany = 64;
+constexpr Shape kSmall = {.width = 19, .height = 7, .isMasked = true};
+
+Shape WithChannels(Shape shape, std::uint32_t channels) {
+  shape.channels = channels;
+  return shape;
+}
 
 /// The entries of one channel within what is collected of `channels` channels.
 std::vector<double> Collected(const std::vector<double>& all, std::uint32_t channels, std::uint32_t c) {
@@ -97,72 +104,82 @@ std::vector<double> Collected(const std::vector<double>& all, std::uint32_t chan
   return some;
 }
 
-void CompareEach(const Operator& op, Shape shape) {
-  const Result many(op, shape);
-  shape.channels = 1;
+void CompareEach(const Operator& op) {
+  std::vector<Result> each;
   for (std::uint32_t c = 0; c < kMany; ++c) {
+    Shape shape = WithChannels(kSmall, 1);
     shape.firstSample = c;
-    const Result one(op, shape);
-    if (op.collects) {
-      EXPECT_EQ(Collected(many.collected, kMany, c), Collected(one.collected, 1, 0)) << c;
-      continue;
-    }
-    EXPECT_TRUE(IsChannel(many, c, one, 0));
-    if (op.channels == Channels::kBeside) {
-      EXPECT_TRUE(IsChannel(many, kMany + c, one, 1));
+    each.emplace_back(op, shape);
+  }
+  for (std::uint32_t channels = 1; channels <= kMany; ++channels) {
+    const Result many(op, WithChannels(kSmall, channels));
+    for (std::uint32_t c = 0; c < channels; ++c) {
+      if (op.collects) {
+        EXPECT_EQ(Collected(many.collected, channels, c), Collected(each[c].collected, 1, 0)) << channels;
+        continue;
+      }
+      EXPECT_TRUE(IsChannel(many, c, each[c], 0)) << channels;
+      if (op.channels == Channels::kBeside) {
+        EXPECT_TRUE(IsChannel(many, channels + c, each[c], 1)) << channels;
+      }
     }
   }
 }
 
-void CompareFirst(const Operator& op, Shape shape) {
-  const Result many(op, shape);
-  shape.channels = op.read;
-  const Result few(op, shape);
-  EXPECT_TRUE(many.scene->Bytes(2) == few.scene->Bytes(2));
-  if (!op.collects) {
-    EXPECT_EQ(many.collected, few.collected);
-    return;
+void CompareFirst(const Operator& op) {
+  const Result few(op, WithChannels(kSmall, op.read));
+  for (std::uint32_t channels = op.read; channels <= kMany; ++channels) {
+    const Result many(op, WithChannels(kSmall, channels));
+    EXPECT_TRUE(many.scene->Bytes(2) == few.scene->Bytes(2)) << channels;
+    for (std::uint32_t c = 0; c < op.read && op.collects; ++c)
+      EXPECT_EQ(Collected(many.collected, channels, c), Collected(few.collected, op.read, c)) << channels;
   }
-  for (std::uint32_t c = 0; c < op.read; ++c)
-    EXPECT_EQ(Collected(many.collected, kMany, c), Collected(few.collected, op.read, c)) << c;
 }
 
-void CompareTogether(const Operator& op, Shape shape) {
+void CompareTogether(const Operator& op) {
+  Shape shape = kSmall;
   shape.isEven = true;
-  const Result many(op, shape);
-  shape.channels = op.read;
-  const Result few(op, shape);
-  for (std::uint32_t c = 0; c < op.outFixed; ++c) EXPECT_TRUE(IsChannel(many, c, few, c, op.gain));
+  const Result few(op, WithChannels(shape, op.read));
+  for (std::uint32_t channels = op.read; channels <= kMany; ++channels) {
+    const double length = std::sqrt(channels);
+    if (op.isLength && length != std::floor(length)) continue;  // rounded
+    const Result many(op, WithChannels(shape, channels));
+    for (std::uint32_t c = 0; c < op.outFixed; ++c)
+      EXPECT_TRUE(IsChannel(many, c, few, c, op.isLength ? length : 1.0)) << channels;
+  }
 }
 
-/// All elements of a row that are read belong to its first pixel, of which the channels are equal.
-void ComparePacked(const Operator& op, Shape shape) {
+/// All elements of a row that are read belong to its first pixels, of which the channels are equal.
+void ComparePacked(const Operator& op) {
+  Shape shape = kSmall;
   shape.isEven = true;
   shape.isMasked = false;
-  const Result many(op, shape);
-  shape.channels = 1;
-  const Result one(op, shape);
-  bool isSomeSet = false;
-  for (std::size_t i = 0; i < one.scene->OutPixels(); ++i) {
-    EXPECT_EQ(many.scene->Result(i, 0), one.scene->Result(i / shape.width * shape.width, 0)) << i;
-    isSomeSet = isSomeSet || many.scene->Result(i, 0) == 1.0;
+  const Result one(op, WithChannels(shape, 1));
+  for (std::uint32_t channels = 1; channels <= kMany; ++channels) {
+    const Result many(op, WithChannels(shape, channels));
+    bool isSomeSet = false;
+    for (std::size_t i = 0; i < one.scene->OutPixels(); ++i) {
+      const std::size_t x = i % shape.width;
+      EXPECT_EQ(many.scene->Result(i, 0), one.scene->Result(i - x + x / channels, 0))
+          << channels << ", " << i;
+      isSomeSet = isSomeSet || many.scene->Result(i, 0) == 1.0;
+    }
+    EXPECT_TRUE(isSomeSet);
   }
-  EXPECT_TRUE(isSomeSet);
 }
 
-TEST_P(Load, ManyChannelsAreSomeMore) {
+TEST_P(Load, ChannelsUpToManyAreSomeMore) {
   const Operator& op = GetParam();
-  const Shape shape{.width = 19, .height = 7, .channels = kMany, .isMasked = true};
   switch (op.channels) {
     case Channels::kEach:
     case Channels::kBeside:
-      return CompareEach(op, shape);
+      return CompareEach(op);
     case Channels::kFirst:
-      return CompareFirst(op, shape);
+      return CompareFirst(op);
     case Channels::kTogether:
-      return CompareTogether(op, shape);
+      return CompareTogether(op);
     case Channels::kPacked:
-      return ComparePacked(op, shape);
+      return ComparePacked(op);
   }
 }
 

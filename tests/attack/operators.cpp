@@ -166,9 +166,10 @@ Made Change(std::uint32_t channels) {
   return made;
 }
 
-template <class Op>
+template <class Op, bool kSixBands>
 Made TasseledCap(std::uint32_t) {
-  auto made = Make<Op>("QuickBird", "Ikonos", changedetection::eDIFF_BACKWARD);
+  auto made = Make<Op>(kSixBands ? "Landsat-5 TM" : "QuickBird", kSixBands ? "Landsat-7 ETM+" : "Ikonos",
+                       changedetection::eDIFF_BACKWARD);
   made->op.SetNoData(kNoData);
   return made;
 }
@@ -185,6 +186,45 @@ Made Statistics(std::uint32_t channels) {
   made->op.SetMethod(kMethod);
   return made;
 }
+
+/// Statistics of the pixels that a decision keeps, which reads all bytes of each.
+class DecidedStatistics final : public Object {
+ public:
+  explicit DecidedStatistics(std::uint32_t channels) : held_(Statistics<kPlain>(channels)) {
+    static_cast<Held<gridmill::RasterStatistics>&>(*held_).op.SetMask(&decision_);
+  }
+
+  void Process(const Call& call) override {
+    const tessel::DataType& type = call.in->dataType;
+    decision_.pixelBytes = std::size_t{call.in->channels} * (type.isComplex ? 2 : 1) * (type.sizeBits / 8);
+    held_->Process(call);
+  }
+
+  std::vector<double> Collected() override {
+    std::vector<double> all = held_->Collected();
+    all.push_back(decision_.sum);
+    return all;
+  }
+
+ private:
+  static constexpr auto kPlain = gridmill::eSTATISTICS_PLAIN;
+
+  struct Decision final : tessel::IMaskDecision {
+    std::size_t pixelBytes = 0;
+    std::uint32_t sum = 0;
+
+    bool IsPixelValid(const void* pixel) override {
+      const auto* const bytes = static_cast<const unsigned char*>(pixel);
+      for (std::size_t i = 0; i < pixelBytes; ++i) sum += bytes[i];
+      return bytes[0] % 3 != 0;
+    }
+  };
+
+  Decision decision_;
+  Made held_;
+};
+
+Made Decided(std::uint32_t channels) { return std::make_unique<DecidedStatistics>(channels); }
 
 template <int kCount>
 Made Classes(std::uint32_t) {
@@ -284,9 +324,10 @@ std::vector<Operator> Changes() {
        .channels = kTogether,
        .outFixed = 3,
        .takesMoreOut = true,
-       .gain = 8.0},
-      {"TCGNChange", TasseledCap<TCGNChange>, kDates, kElements, kFirst, 4, 4, 3, 0, true},
-      {"TCSBChange", TasseledCap<TCSBChange>, kDates, kElements, kFirst, 4, 4, 3, 0, true},
+       .isLength = true},
+      {"TCGNChange", TasseledCap<TCGNChange, false>, kDates, kElements, kFirst, 4, 4, 3, 0, true},
+      {"TCGNChange, six bands", TasseledCap<TCGNChange, true>, kDates, kElements, kFirst, 6, 6, 3, 0, true},
+      {"TCSBChange", TasseledCap<TCSBChange, false>, kDates, kElements, kFirst, 4, 4, 3, 0, true},
   };
 }
 
@@ -311,9 +352,12 @@ std::vector<Operator> Services() {
   Operator blueStatistics = statistics("RasterStatistics, blue", Statistics<eSTATISTICS_SYNTHETIC_BLUE>);
   blueStatistics.channels = kFirst;
   blueStatistics.read = 3;
+  Operator decided = statistics("RasterStatistics, decided", Decided);
+  decided.channels = kFirst;
   return {
       statistics("RasterStatistics", Statistics<eSTATISTICS_PLAIN>),
       blueStatistics,
+      decided,
       {"RangeClasses", Classes<3>, Takes::kPair, kRefused, kFirst, 1, 1, 1, 0, true},
       {"RangeClasses, many", Classes<300>, Takes::kPair, kRefused, kFirst, 1, 1, 1, 0, true},
       {.name = "IIIDataTransfer",
@@ -392,6 +436,8 @@ std::vector<Types> TypesOf(const Operator& op) {
     types.push_back({eDT_16U, eDT_16U, eDT_64U});
     types.push_back({eDT_32S, eDT_64F, eDT_32U});
   }
+  // Gathered, and as wide as it is read: a sample more lies behind the buffer.
+  if (op.takes == Takes::kDates) types.push_back({eDT_32F, eDT_32S, eDT_32F});
   if (op.complex != Complex::kRefused) {
     types.push_back({complexFloat, complexFloat, eDT_32F});
     types.push_back({complexShort, complexShort, eDT_8U});

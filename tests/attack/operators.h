@@ -47,7 +47,7 @@ enum class Channels {
   kEach,      ///< each gives the same channel of the output, or an entry of what is collected
   kFirst,     ///< the first ones are read
   kPacked,    ///< as many elements of a row are read as it has pixels
-  kTogether,  ///< all matter; 64 equal ones make a result `gain` times as large as `read` ones
+  kTogether,  ///< all matter; equal ones give what `read` ones give
   kBeside,    ///< those of the input, then those of the reference
 };
 
@@ -65,7 +65,7 @@ struct Operator {
   bool isKept = false;         ///< the processor is built once, and reads a later input of another type
   bool isParallel = false;
   bool collects = false;  ///< the output is not touched
-  double gain = 1.0;
+  bool isLength = false;  ///< n equal channels make a result sqrt(n) times as large
 };
 
 std::ostream& operator<<(std::ostream& stream, const Operator& op);

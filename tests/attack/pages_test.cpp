@@ -2,6 +2,7 @@
 #include <cstdio>
 #include <cstring>
 #include <memory>
+#include <string_view>
 #include <vector>
 
 #include <gtest/gtest.h>
@@ -19,7 +20,7 @@ namespace {
 
 using tessel::DataType;
 
-constexpr std::size_t kLargest = 256 * 1024;
+constexpr std::size_t kLargest = 4 << 20;
 
 // What is called, for the message that an access outside leaves.
 char place[256];
@@ -95,7 +96,14 @@ INSTANTIATE_TEST_SUITE_P(Attack, Pages, testing::ValuesIn(Operators()));
 struct Extent {
   std::uint32_t width, height;
 };
-constexpr Extent kExtents[] = {{1, 1}, {2, 3}, {7, 2}, {16, 4}, {33, 3}, {70, 9}};
+constexpr Extent kExtents[] = {{1, 1}, {2, 3}, {7, 2}, {16, 4}, {33, 3}, {70, 9}, {259, 2}};
+
+/// What the last pixel of an output takes behind it if it is written in elements of the type `kept`.
+std::size_t RoomBehind(const Shape& shape, const Operator& op, const DataType& kept, const Types& types) {
+  if (kept.sizeBits <= types.out.sizeBits) return 0;
+  const std::size_t elements = op.outFixed + std::size_t{op.outEach} * shape.channels;
+  return elements * (kept.sizeBits - types.out.sizeBits) / 8;
+}
 
 /// Calls `visit(shape)` for all sizes and numbers of channels, with each margin and mask for some of them.
 template <class Visit>
@@ -135,6 +143,41 @@ TEST_P(Pages, NothingOutsideOfALaterInputOfAnotherTypeIsRead) {
       ForEachShape(op, [&](const Shape& shape) {
         Scene before(op, shape, first);
         if (!HasFailure()) Try(shape, later, &before);
+      });
+    }
+  }
+}
+
+TEST_P(Pages, NothingOutsideOfLongRowsAndManyChannelsIsTouched) {
+  const std::vector<Types> all = TypesOf(op);
+  for (std::size_t i = 0; i < 5; ++i) {
+    for (const std::uint32_t channels : {1u, 2u, 6u, 7u, 17u, 64u}) {
+      const Shape shape{.width = 2053, .height = 1, .channels = channels, .isMasked = channels % 2 == 0};
+      if (channels >= op.least && !HasFailure()) Try(shape, all[i]);
+    }
+  }
+}
+
+/// Their room is what the elements of the first output take behind the last pixel, and no more.
+TEST_P(Pages, NothingOutsideOfALaterOutputOfAnotherTypeIsTouched) {
+  const std::string_view name = op.name;
+  if (op.collects || !(op.isKept || name == "BitmapFiltering" || name == "IntenPercent")) return;
+  const DataType in = tessel::eDT_8U;
+  for (const tessel::ElementType first : {tessel::eDT_64F, tessel::eDT_16S, tessel::eDT_8U}) {
+    for (const tessel::ElementType out : {tessel::eDT_8U, tessel::eDT_32F, tessel::eDT_64F}) {
+      ForEachShape(op, [&](Shape shape) {
+        shape.moreOut = 0;
+        const Types types = {in, in, out};
+        const std::size_t room = RoomBehind(shape, op, first, types);
+        Scene before(op, shape, {in, in, first});
+        Result results[2];
+        for (const bool atEnd : {true, false}) {
+          Scene scene(op, shape, types, [&](std::size_t raster, std::size_t bytes) {
+            return pages[raster].Place(bytes + (raster == 2 ? room : 0), atEnd);
+          });
+          results[atEnd] = Run(scene, shape.channels, &before);
+        }
+        EXPECT_TRUE(results[0] == results[1]);
       });
     }
   }

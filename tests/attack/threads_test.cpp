@@ -115,6 +115,15 @@ TEST(AllThreads, AllOperatorsRunAtOnceInTwoOrders) {
   for (std::size_t i = 0; i < all.size(); ++i) EXPECT_TRUE(forwards[i] == backwards[i]) << all[i];
 }
 
+/// The threads of a parallel region that this thread enters.
+int TeamSize() {
+  int size = 0;
+#pragma omp parallel
+#pragma omp single
+  size = omp_get_num_threads();
+  return size;
+}
+
 TEST_P(Threads, TeamsOfAnySizeGiveTheSameBits) {
   const Operator& op = GetParam();
   if (!op.isParallel) return;
@@ -123,11 +132,36 @@ TEST_P(Threads, TeamsOfAnySizeGiveTheSameBits) {
     Scene scene(op, shape, kWider);
     omp_set_num_threads(1);
     const Result wanted = ResultOf(op, scene, shape.channels);
-    for (int team = 2; team <= 8; ++team) {
+    for (int team = 1; team <= 8; ++team) {
       omp_set_num_threads(team);
+      EXPECT_EQ(TeamSize(), team);
       scene.Clear();
       EXPECT_TRUE(ResultOf(op, scene, shape.channels) == wanted) << team << " threads";
     }
+  }
+  omp_set_num_threads(threads);
+}
+
+TEST_P(Threads, TwoObjectsAtOnceHaveTeamsOfAnySize) {
+  const Operator& op = GetParam();
+  if (!op.isParallel) return;
+  const int threads = omp_get_max_threads();
+  const Shape shape = ShapeOf(op);
+  Scene first(op, shape, kWider), second(op, shape, kFloats);
+  omp_set_num_threads(1);
+  const Result wantedFirst = ResultOf(op, first, shape.channels);
+  const Result wantedSecond = ResultOf(op, second, shape.channels);
+  for (int team = 1; team <= 8; ++team) {
+    const auto run = [&](Scene& scene, int size) {
+      omp_set_num_threads(size);  // of this thread
+      return ResultOf(op, scene, shape.channels);
+    };
+    Result firstResult, secondResult;
+    first.Clear();
+    second.Clear();
+    AtOnce([&] { firstResult = run(first, team); }, [&] { secondResult = run(second, 9 - team); });
+    EXPECT_TRUE(firstResult == wantedFirst) << team << " threads";
+    EXPECT_TRUE(secondResult == wantedSecond) << 9 - team << " threads";
   }
   omp_set_num_threads(threads);
 }
