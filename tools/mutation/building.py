@@ -1,5 +1,6 @@
 """Compiles mutants with the commands of a build tree and links them with its other objects."""
 
+import ctypes
 import json
 import os
 import pathlib
@@ -8,17 +9,27 @@ import resource
 import shlex
 import signal
 import subprocess
-import time
+import tempfile
+import threading
 
 import schema
 
 MEMORY = 6 << 30  # bytes of address space of a test: a mutant may ask for any size
+PRINTED = 64 << 20  # bytes that it may print
+PATIENCE = 30  # seconds to wait for one of processor time, on a machine with other work
+LIBC = ctypes.CDLL(None)
+PR_SET_PDEATHSIG = 1
+NO_END = "no end"
 POSITION = r"^{}:(\d+):(\d+): (?:fatal )?error:"
 REQUIRED = r"^{}:(\d+):(\d+):\s+(?:required|in)"
 
 
 class Failed(Exception):
-    pass
+    """The compiler or the linker failed."""
+
+
+class Ended(Exception):
+    """The run was broken off."""
 
 
 class Build:
@@ -31,6 +42,8 @@ class Build:
         self.libraries = ["-lgtest", "-lgtest_main", "-fopenmp", "-lpthread"]
         for entry in json.loads((folder / "compile_commands.json").read_text(encoding="utf-8")):
             command = entry.get("arguments") or shlex.split(entry["command"])
+            while not command[1].startswith("-"):  # a launcher
+                command = command[1:]
             target = command[command.index("-o") + 1]
             if "gridmill_objects.dir" in target or "gridmill_test_objects.dir" in target:
                 path = str(pathlib.Path(entry["file"]).relative_to(root))
@@ -78,11 +91,10 @@ class Build:
         own = [p for p in users if p == path.removesuffix(".h") + ".cpp"]
         size = {p: (path not in self.includes[p], os.path.getsize(self.root / p)) for p in users}
         few = own + sorted((p for p in users if p not in own), key=size.get)[: 2 - len(own)]
-        tests = [
-            p
-            for p in self.commands
-            if re.match(r"tests/(basic|frame|kernels)/", p) and path in self.includes[p]
-        ]
+        # Tests have their own copies of what the file holds inline.
+        tests = [p for p in self.commands if re.match(r"tests/(basic|frame|kernels)/", p)]
+        tests = [p for p in tests if self.reaches(p, path)]
+        tests.sort(key=lambda p: path not in self.includes[p])
         sets = [few + tests[:2]]
         if len(users) > len(few):
             sets.append(users + tests)
@@ -90,9 +102,13 @@ class Build:
 
     # ---- compiling and linking
 
+    def _overlay_of(self, label, mutated):
+        """A folder that holds no other mutated file."""
+        return self.overlay / label / mutated.replace("/", "_")
+
     def compile(self, source, mutated, text, label):
         """The object of `source` where the file `mutated` has this text; raises Failed with the messages."""
-        overlay = self.overlay / label
+        overlay = self._overlay_of(label, mutated)
         changed = overlay / mutated
         changed.parent.mkdir(parents=True, exist_ok=True)
         changed.write_text(text, encoding="utf-8")
@@ -111,20 +127,19 @@ class Build:
             "-w",
             "-Wno-narrowing",
             "-DGRIDMILL_PINNED",
+            "-D_GLIBCXX_ASSERTIONS",
             "-fmax-errors=0",
             "-fno-diagnostics-color",
         ]
         command += ["-include", str(self.work / "switch.h"), "-c", str(file), "-o", str(target)]
-        run = subprocess.run(
-            command, cwd=self.folder, capture_output=True, text=True, errors="replace", check=False
-        )
-        if run.returncode != 0:
-            raise Failed(run.stderr)
+        code, messages, _ = CHILDREN.run(command, cwd=self.folder)
+        if code != 0:
+            raise Failed(messages)
         return target
 
     def positions(self, messages, label, mutated):
         """Where in the mutated file the compiler saw errors, or what it came from."""
-        file = re.escape(str(self.overlay / label / mutated))
+        file = re.escape(str(self._overlay_of(label, mutated) / mutated))
         for pattern in (POSITION, REQUIRED):
             found = re.findall(pattern.format(file), messages, re.MULTILINE)
             if found:
@@ -134,20 +149,16 @@ class Build:
     def link(self, objects, label):
         """The tests with these objects, by source, instead of the build's own."""
         program = self.overlay / label / "tests"
+        program.parent.mkdir(parents=True, exist_ok=True)
         others = [str(target) for path, (_, target) in self.commands.items() if path not in objects]
         # The mutated objects come first: of an inline function, the linker takes the one that it sees first.
         arguments = [str(self.switch), *map(str, objects.values()), *others, *self.libraries]
         response = self.overlay / label / "link.txt"
         response.write_text("\n".join(arguments), encoding="utf-8")
         linker = ["-fuse-ld=lld"] if self._has_lld() else []
-        run = subprocess.run(
-            [self.compiler, *linker, "-o", program, f"@{response}"],
-            capture_output=True,
-            text=True,
-            check=False,
-        )
-        if run.returncode != 0:
-            raise Failed(run.stderr)
+        code, messages, _ = CHILDREN.run([self.compiler, *linker, "-o", program, f"@{response}"])
+        if code != 0:
+            raise Failed(messages)
         return program
 
     def _has_lld(self):
@@ -181,9 +192,18 @@ class Build:
         return ":".join(f"{s}.*:*/{s}.*:{s}/*.*:*/{s}/*.*" for s in sorted(suites))
 
     def tests_of(self, path):
-        """A filter for the tests that are made for a file."""
-        headers = {path, path.removesuffix(".cpp") + ".h"}
-        users = {p for p in self.includes if headers & set(self.includes[p])} | {path}
+        """A filter for the tests that bear the name of a file, or include it where no operator is called."""
+        suites = set()
+        for test in (p for p in self.commands if p.startswith("tests/")):
+            direct = path in self.includes[test] and re.match(r"tests/(basic|frame|kernels)/", test)
+            if direct or pathlib.Path(test).stem.removesuffix("_test") == pathlib.Path(path).stem:
+                suites |= self._suites(test)
+        return self._filter(suites)
+
+    def tests_of_users(self, path, members=None):
+        """A filter for the tests of all sources that include a file: with members only of those."""
+        header = path.removesuffix(".cpp") + ".h"
+        users = {p for p in self.includes if header in self.includes[p]} if members is None else set(members)
         stems = {pathlib.Path(p).stem for p in users if not p.startswith("tests/")}
         suites = set()
         for test in (p for p in self.commands if p.startswith("tests/")):
@@ -192,35 +212,78 @@ class Build:
         return self._filter(suites)
 
 
-def limit():
-    resource.setrlimit(resource.RLIMIT_AS, (MEMORY, MEMORY))
-    resource.setrlimit(resource.RLIMIT_CORE, (0, 0))
+class Children:
+    """The processes that run, each with its own children in a session. They end with this one."""
+
+    def __init__(self):
+        self.lock, self.alive, self.are_ended = threading.Lock(), set(), False
+
+    def run(self, command, cwd=None, environment=None, cpu_seconds=None):
+        """(exit code, output, seconds of processor time); the code is -SIGXCPU if that does not suffice."""
+        limits = [(resource.RLIMIT_CORE, 0)]
+        if cpu_seconds is not None:
+            limits += [(resource.RLIMIT_AS, MEMORY), (resource.RLIMIT_FSIZE, PRINTED)]
+            limits.append((resource.RLIMIT_CPU, int(cpu_seconds) + 1))
+
+        def prepare():
+            LIBC.prctl(PR_SET_PDEATHSIG, signal.SIGKILL)
+            for which, amount in limits:
+                resource.setrlimit(which, (amount, amount + 1 if which == resource.RLIMIT_CPU else amount))
+
+        with tempfile.TemporaryFile() as output:
+            with self.lock:
+                if self.are_ended:
+                    raise Ended
+                process = subprocess.Popen(
+                    command,
+                    cwd=cwd,
+                    env=environment,
+                    stdout=output,
+                    stderr=subprocess.STDOUT,
+                    preexec_fn=prepare,
+                    start_new_session=True,
+                )
+                self.alive.add(process.pid)
+            late = threading.Event()
+            timer = threading.Timer(PATIENCE * (cpu_seconds or 600), self._kill, (process.pid, late))
+            timer.start()
+            _, status, usage = os.wait4(process.pid, 0)
+            timer.cancel()
+            with self.lock:
+                self.alive.discard(process.pid)
+                if self.are_ended:
+                    raise Ended
+            process.returncode = -signal.SIGXCPU if late.is_set() else os.waitstatus_to_exitcode(status)
+            output.seek(0)
+            text = output.read().decode(errors="replace")
+        return process.returncode, text, usage.ru_utime + usage.ru_stime
+
+    def _kill(self, pid, late=None):
+        with self.lock:
+            if pid in self.alive:
+                if late:
+                    late.set()
+                os.killpg(pid, signal.SIGKILL)
+
+    def end(self):
+        with self.lock:
+            self.are_ended = True
+            for pid in self.alive:
+                os.killpg(pid, signal.SIGKILL)
 
 
-def run_tests(program, number, tests, seconds, shard=(0, 1)):
-    """(whether all passed, the reason why not, the seconds it took)."""
+CHILDREN = Children()
+
+
+def run_tests(program, number, tests, seconds):
+    """(whether all passed, the reason why not, the seconds of processor time)."""
     environment = dict(os.environ, GRIDMILL_MUTANT=str(number), GTEST_FAIL_FAST="1", GTEST_BRIEF="1")
-    environment |= {"GTEST_TOTAL_SHARDS": str(shard[1]), "GTEST_SHARD_INDEX": str(shard[0])}
-    before = time.monotonic()
-    process = subprocess.Popen(
-        [program, f"--gtest_filter={tests}"],
-        env=environment,
-        stdout=subprocess.PIPE,
-        stderr=subprocess.STDOUT,
-        text=True,
-        errors="replace",
-        preexec_fn=limit,
-        start_new_session=True,
-    )
-    try:
-        output, _ = process.communicate(timeout=seconds)
-    except subprocess.TimeoutExpired:
-        os.killpg(process.pid, signal.SIGKILL)
-        process.communicate()
-        return False, f"no end after {seconds:.0f} s", time.monotonic() - before
-    took = time.monotonic() - before
-    if process.returncode == 0:
+    environment["OMP_WAIT_POLICY"] = "passive"  # other mutants run at the same time
+    code, output, took = CHILDREN.run([program, f"--gtest_filter={tests}"], None, environment, seconds)
+    if code == 0:
         return True, "", took
+    if code == -signal.SIGXCPU:
+        return False, NO_END, took
     failed = re.search(r"\[  FAILED  \] ([\w/.]+)", output)
-    running = "a test" if process.returncode > 0 else f"signal {-process.returncode}"
+    running = "a test" if code > 0 else f"signal {-code}"
     return False, failed[1] if failed else running, took

@@ -285,7 +285,16 @@ class Finder:
     def _number(self, i, token):
         pure = self.tokens[i - 1].text == "=" and self.tokens[i - 2].text in (")", "const", "override")
         for other in [] if pure else changed_numbers(token.text):
-            self._add(i, i, i, "literal", f"{token.text} -> {other}", other, "choice")
+            form = None if self._is_extent(i) else "choice"
+            self._add(i, i, i, "literal", f"{token.text} -> {other}", other, form)
+
+    def _is_extent(self, i):
+        """True for the N of `T name[N]`: with a choice there it would become an array of variable length."""
+        if self.tokens[i - 1].text != "[" or self.tokens[i + 1].text != "]":
+            return False
+        before = self.tokens[i - 3]
+        is_type = before.kind == "name" and before.text not in WORDS or before.text in (">", "*", "&")
+        return self.tokens[i - 2].kind == "name" and is_type
 
     def _condition(self, first, last, at, form="negation"):
         text = self.source.plain(self.tokens[first].start, self.tokens[last].end)
