@@ -88,7 +88,8 @@ class FilterSequence {
     Target::Reshape(bytes_, outShape);
     const Buffer expected(outShape, isRoomy), actual(outShape, isRoomy);
     Fill(bytes_, readAs_, *in);
-    Compare(in, mask.get(), expected, actual);
+    Run(in, mask.get(), expected, actual);
+    if (!ShowsPayloads(outShape, *in, mask.get())) RequireSame(*expected, *actual, writtenAs_);
   }
 
  private:
@@ -121,16 +122,26 @@ class FilterSequence {
     writtenAs_ = out_;
   }
 
-  void Compare(const Buffer& in, tessel::Mask* mask, const Buffer& expected, const Buffer& actual) {
+  /// Runs operator and twin, and looks at all but their results.
+  void Run(const Buffer& in, tessel::Mask* mask, const Buffer& expected, const Buffer& actual) {
     const std::vector<unsigned char> before = BytesOf(*in), bits = BytesOf(mask);
     Target::Twin(*held_, readAs_, writtenAs_, *in, mask, *expected);
     if (Target::isParallel) omp_set_num_threads(DrawThreads(bytes_));
     Target::Process(*op_, in.Get(), mask, actual.Get());
     Observed().Add(*actual, writtenAs_);
-    RequireSame(*expected, *actual, writtenAs_);
     RequireUntouched(before, BytesOf(*in));
     RequireUntouched(bits, BytesOf(mask));
     if (!in.IsIntact() || !actual.IsIntact()) Fail("a sentinel beside a buffer was overwritten");
+  }
+
+  /// True if elements overlap and one of them is NaN. What is left to see of it is a part of its payload, and
+  /// which one a sum of two NaNs takes over is the compiler's choice.
+  bool ShowsPayloads(Shape out, const tessel::Raster& in, const tessel::Mask* mask) const {
+    if (!writtenAs_.isFloat || writtenAs_.sizeBits <= out.type.sizeBits) return false;
+    out.type = writtenAs_;
+    const Buffer apart(out, true);
+    Target::Twin(*held_, readAs_, writtenAs_, in, mask, *apart);
+    return HasNaN(*apart);
   }
 
   Bytes& bytes_;

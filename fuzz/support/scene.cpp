@@ -162,6 +162,14 @@ void RequireSame(const Raster& expected, const Raster& actual, const DataType& w
   }
 }
 
+bool HasNaN(const Raster& raster) {
+  const std::uint64_t size = raster.dataType.sizeBits / 8;
+  for (std::uint64_t at = 0; at + size <= raster.dataSize; at += size) {
+    if (size == sizeof(float) ? IsNaNAt<float>(raster, at) : IsNaNAt<double>(raster, at)) return true;
+  }
+  return false;
+}
+
 void RequireUntouched(const std::vector<unsigned char>& before, const std::vector<unsigned char>& after) {
   if (before != after) Fail("an input was modified");
 }

@@ -66,6 +66,9 @@ std::vector<unsigned char> BytesOf(const tessel::Mask* mask);
 void RequireSame(const tessel::Raster& expected, const tessel::Raster& actual,
                  const tessel::DataType& writtenAs);
 
+/// True if a sample of a raster of floating-point numbers is NaN, in the margins too.
+bool HasNaN(const tessel::Raster& raster);
+
 /// Fails if an input was modified.
 void RequireUntouched(const std::vector<unsigned char>& before, const std::vector<unsigned char>& after);
 
