@@ -97,7 +97,7 @@ class RasterStatistics::InnerProcessor : public filters::IProcessor, public deta
   void Process(tessel::Raster* in, tessel::Mask*, tessel::Raster*) const override {
     std::vector<Tally> tallies;
     const std::size_t counted = std::min<std::size_t>(in->channels, histograms.size());
-    // NOLINTNEXTLINE(performance-inefficient-vector-operation): there are as few as channels
+    tallies.reserve(counted);
     for (std::size_t c = 0; c < counted; ++c) tallies.emplace_back(histograms[c], minValues[c], maxValues[c]);
 
     CountImage(*in, tallies);

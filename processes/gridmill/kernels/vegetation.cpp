@@ -261,9 +261,8 @@ void NarrowVegetationRow(std::size_t code, const BandPlanes& bands, std::size_t 
       RowOf<Dvi<float>, float, float>,   RowOf<Rvi<float>, float, float>,
       RowOf<Ndvi<float>, float, float>,  nullptr,
       RowOf<NarrowSavi, float, float>};
-  const bool narrow = code < std::size(kRows) && kRows[code] != nullptr;
   const auto& rows = AllIndices::kRows<float>;
-  (narrow ? kRows[code] : rows[code])(bands, count, index);
+  (kRows[code] != nullptr ? kRows[code] : rows[code])(bands, count, index);
 }
 
 void VegetationPixels(const BandPlanes& bands, std::size_t count, float* target) {
