@@ -73,16 +73,17 @@ TEST(ChangeRows, EveryPixelComesOnceAndInOrder) {
   }
 }
 
-/// The validity of the pixels of one row under two masks.
-std::vector<unsigned char> ValidPixels(const Mask* mask, const Mask* referenceMask) {
-  Image<char> image({19, 1});
+/// The validity of the pixels of one row under two masks, in blocks as large as they can be.
+std::vector<unsigned char> ValidPixels(const Mask* mask, const Mask* referenceMask,
+                                       std::uint32_t width = 19) {
+  Image<char> image({width, 1});
   std::vector<unsigned char> valid;
-  ChangeRows<char, char, char>({image, image, image, mask, referenceMask}, PixelBlocks(1, 1, 1),
+  ChangeRows<char, char, char>({image, image, image, mask, referenceMask}, SampleBlocks(1),
                                [&](const auto& block) {
                                  if (block.masked) {
-                                   valid.assign(block.valid, block.valid + block.pixels);
+                                   valid.insert(valid.end(), block.valid, block.valid + block.pixels);
                                  } else {
-                                   valid.assign(block.pixels, 1);
+                                   valid.insert(valid.end(), block.pixels, 1);
                                  }
                                });
   return valid;
@@ -100,6 +101,17 @@ TEST(ChangeRows, SetBitOfTheReferenceMaskExcludesThePixel) {
   EXPECT_EQ(ValidPixels(&mask, nullptr), byMask);
   EXPECT_EQ(ValidPixels(nullptr, &referenceMask), byReference);
   EXPECT_EQ(ValidPixels(&mask, &referenceMask), byBoth);
+}
+
+TEST(ChangeRows, ReferenceMaskOfAFullBlockExcludesItsPixelsAlone) {
+  const std::uint32_t width = kMaxBlock + 1;
+  Mask referenceMask(width, 1, {}, true);
+  std::vector<unsigned char> valid(width, 0);
+  for (const std::uint32_t x : {0u, width - 2, width - 1}) {
+    referenceMask.SetValid(static_cast<int>(x), 0, false);
+    valid[x] = 1;
+  }
+  EXPECT_EQ(ValidPixels(nullptr, &referenceMask, width), valid);
 }
 
 TEST(SampleBlocks, HoldWholeVectorsOfPixelsAndAtLeastOne) {

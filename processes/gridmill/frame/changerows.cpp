@@ -1,6 +1,7 @@
 #include "processes/gridmill/frame/changerows.h"
 
 #include <algorithm>
+#include <array>
 #include <cstdint>
 #include <cstring>
 #include <vector>
@@ -64,8 +65,8 @@ bool UnpackMasks(const TwoDates& dates, std::uint32_t x, std::uint32_t y, std::s
     std::fill_n(valid, pixels, static_cast<unsigned char>(1));
   }
   if (dates.referenceMask != nullptr) {
-    unsigned char excluded[kMaxBlock];
-    unpack(*dates.referenceMask, excluded);
+    std::array<unsigned char, kMaxBlock> excluded;
+    unpack(*dates.referenceMask, excluded.data());
     for (std::size_t i = 0; i < pixels; ++i) valid[i] &= static_cast<unsigned char>(excluded[i] ^ 1);
   }
   return std::memchr(valid, 0, pixels) != nullptr;
