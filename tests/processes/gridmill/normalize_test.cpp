@@ -472,6 +472,18 @@ TEST(NormalizeQuotients, AgreeWithTheTwinsHalfWayBetweenFloats) {
   }
 }
 
+TEST(NormalizeQuotients, AgreeWithTheTwinsOnPixelsOfMoreSamplesThanABlock) {
+  constexpr std::uint32_t kChannels = 2500;
+  std::vector<float> min, max;
+  for (std::uint32_t c = 0; c < kChannels; ++c) {
+    min.push_back(static_cast<float>(c % 5));
+    max.push_back(min.back() + static_cast<float>(25 + 2 * (c % 400)));  // ranges that a product serves
+  }
+  Image<unsigned char> in({2, 1, kChannels});
+  in.Set([](int x, int, std::uint32_t c) { return 50 * x + static_cast<int>(c % 100); });
+  EXPECT_TRUE(AgreesForAllOutputs(RangeOf(min, max, -1), in));
+}
+
 TEST(NormalizeQuotients, AgreeWithTheTwinsHalfWayBetweenDenormals) {
   tests::Random random(20240416);
   for (std::uint32_t odd = 1; odd < 400; odd += 2) {

@@ -631,20 +631,21 @@ TEST_P(VegIndexDifferential, AgreesWithTheTwinOnManyRandomPixelsOfSevenBands) {
   }
 }
 
-/// Compares operator and twin on one index of pixels of four channels.
-::testing::AssertionResult AgreesOnPixelsOfFourChannels(tests::Random& random, const DataType& in,
-                                                        const DataType& out, unsigned int code) {
+/// Compares operator and twin on one index of pixels of a few channels.
+::testing::AssertionResult AgreesOnPixelsOf(std::uint32_t channels, tests::Random& random, const DataType& in,
+                                            const DataType& out, unsigned int code) {
   constexpr std::uint32_t kWidths[] = {1, 7, 63, 64, 257, 300, 2049};
   tests::Case c;
   c.in = in;
   c.out = out;
-  c.size = {random.Pick(kWidths), 1 + random.Below(2), 4};
+  c.size = {random.Pick(kWidths), 1 + random.Below(2), channels};
   c.inMargins = {random.Below(2), random.Below(2)};
   c.maskKind = random.OneIn(2) ? tests::MaskKind::eNULL : random.Pick(tests::kMaskKinds);
   c.fill = random.OneIn(2) ? tests::Fill::eBITS : random.Pick(tests::kFills);
   c.seed = random.Bits();
-  Codes roles = random.OneIn(3) ? DrawRoles(random, 4) : Codes{eBAND_RED, eBAND_GREEN, eBAND_NIR, 9};
-  std::swap(roles[0], roles[random.Below(4)]);
+  Codes roles = random.OneIn(3) ? DrawRoles(random, channels) : Codes{eBAND_RED, eBAND_GREEN, eBAND_NIR};
+  if (roles.size() < channels) roles.resize(channels, 9);
+  std::swap(roles[0], roles[random.Below(channels)]);
   const VegIndex index = OperatorOf(RequestsOf({code}), roles);
   ::testing::AssertionResult result = Agree(
       c, kExtra, [&](Raster* image, Mask* mask, Raster* target) { index.Process(image, mask, target); },
@@ -654,13 +655,14 @@ TEST_P(VegIndexDifferential, AgreesWithTheTwinOnManyRandomPixelsOfSevenBands) {
   return result << ", code " << code << ", bandIndex " << ::testing::PrintToString(roles);
 }
 
-TEST_P(VegIndexDifferential, AgreesWithTheTwinOnOneIndexOfPixelsOfFourChannels) {
+TEST_P(VegIndexDifferential, AgreesWithTheTwinOnOneIndexOfPixelsOfThreeToFiveChannels) {
+  constexpr std::uint32_t kChannels[] = {4, 4, 3, 4, 4, 4, 5, 4};
   tests::Random random(20240504);
   for (unsigned int code = 0; code < kIndices; ++code) {
     for (const PixelType& out : tests::kPixelTypes) {
-      const int trials = out.element == tessel::eDT_32F ? 8 : 2;
-      for (int trial = 0; trial < trials; ++trial)
-        ASSERT_TRUE(AgreesOnPixelsOfFourChannels(random, GetParam().element, out.element, code));
+      const std::size_t trials = out.element == tessel::eDT_32F ? std::size(kChannels) : 3;
+      for (std::size_t trial = 0; trial < trials; ++trial)
+        ASSERT_TRUE(AgreesOnPixelsOf(kChannels[trial], random, GetParam().element, out.element, code));
     }
   }
 }
