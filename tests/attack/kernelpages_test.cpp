@@ -1,6 +1,7 @@
 #include <algorithm>
 #include <cstddef>
 #include <cstdint>
+#include <limits>
 #include <memory>
 #include <type_traits>
 #include <utility>
@@ -8,6 +9,7 @@
 
 #include <gtest/gtest.h>
 
+#include "processes/gridmill/kernels/bytecolours.h"
 #include "processes/gridmill/kernels/changenodata.h"
 #include "processes/gridmill/kernels/channelratio.h"
 #include "processes/gridmill/kernels/channelsums.h"
@@ -375,6 +377,36 @@ TEST(KernelPages, BytesAreCounted) {
                                     rows.Numbers<unsigned char>(n)};
     kernels::SplitTriples(rows.Numbers<unsigned char>(3 * n), n, bands[0], bands[1], bands[2]);
   });
+}
+
+/// Colours of pixels of which none is background.
+kernels::ByteColours ColoursOfAll(bool trims) {
+  constexpr float infinity = std::numeric_limits<float>::infinity();
+  kernels::ByteColours colours{};
+  std::fill_n(colours.background, 3, -1);
+  for (auto& range : colours.range) range = kernels::ValidRange(-infinity, infinity).Of<unsigned char>();
+  colours.least = -infinity;
+  colours.greatest = infinity;
+  colours.trims = trims;
+  std::fill_n(colours.trim, 3, kernels::Trim{10.0f, 1.5f});
+  std::fill_n(colours.written, 3, static_cast<unsigned char>(7));
+  return colours;
+}
+
+TEST(KernelPages, ColoursOfBytesAreMade) {
+  using Planes = unsigned char(*)[kBlock];
+  for (const bool trims : {false, true}) {
+    const kernels::ByteColours colours = ColoursOfAll(trims);
+    int made = 0;
+    ForCounts([&](Rows& rows, std::size_t n) {
+      const auto* const planes = reinterpret_cast<Planes>(rows.Numbers<unsigned char>(3 * kBlock));
+      const auto bands = reinterpret_cast<Planes>(rows.Scratch<unsigned char>(3 * kBlock));
+      if (!colours.Make(planes, rows.Valid(n), n, bands)) return;
+      ++made;
+      for (std::size_t c = 0; c < 3; ++c) std::copy_n(bands[c], n, rows.Numbers<unsigned char>(n));
+    });
+    EXPECT_GT(made, 150);
+  }
 }
 
 TEST(KernelPages, MeansRatiosAndLogarithmsAreFormed) {
