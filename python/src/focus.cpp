@@ -1,3 +1,4 @@
+#include <cstdio>
 #include <string>
 
 #include "operator.h"
@@ -39,6 +40,8 @@ void ProcessFocus(Holder& self, const py::object& given, const py::object& given
     Raster in = image.Rows(0, image.height);
     std::optional<Mask> valid = mask.Rows(0, image.height);
     self.op.Process(&in, Pointer(valid), nullptr);
+    // Otherwise the lines leave at the end of the process, wherever its standard output then goes.
+    std::fflush(stdout);
   });
 }
 

@@ -153,6 +153,20 @@ gm.squared_gradient(np.array([[[1, 2]], [[4, 6]]], np.uint8))
     assert run.stdout == "\n BEFORE - 101 9.000000\n\n BEFORE - 101 16.000000\n"
 
 
+def test_trace_of_the_squared_gradient_is_held_back_by_the_file_descriptor():
+    code = """
+import os
+import numpy as np, gridmill as gm
+output = os.dup(1)
+os.dup2(os.open(os.devnull, os.O_WRONLY), 1)
+gm.squared_gradient(np.array([[1, 2], [4, 6]], np.uint8))
+os.dup2(output, 1)
+print("done")
+"""
+    run = subprocess.run(python(code), capture_output=True, text=True, timeout=100)
+    assert (run.returncode, run.stderr, run.stdout) == (0, "", "done\n")
+
+
 @pytest.mark.parametrize("each", **named([BY_NAME[name] for name in ("slope", "aspect", "average_channels")]))
 def test_number_of_threads_changes_no_bit(each):
     images = each.images(seeded(each.name), (700, 900), "float32")
